@@ -1,0 +1,53 @@
+#pragma once
+
+// Records the GL (and eglGetCurrentContext) calls the runtime makes, on their
+// way to the real driver: test binaries linked with vi_link_recorded() have
+// every runtime call of these functions routed through -Wl,--wrap wrappers
+// that append the call to a log and then call the real function. Only calls
+// made from the runtime's static objects (and the test's own code) pass here;
+// the driver answers every call.
+
+#include <mutex>
+#include <string>
+#include <vector>
+
+namespace vitest {
+
+struct GlCall {
+    std::string name;           // "glTexImage2D"
+    std::vector<double> args;   // numeric arguments in order; pointers as addresses
+    std::string text;           // glShaderSource: the source; glGet*Location: the name
+};
+
+class GlRecorder {
+public:
+    // Clears the log and starts recording; stop() ends it. Recording is off at start.
+    static void start();
+    static void stop();
+    static void clear();
+    static bool isRecording();
+
+    static std::vector<GlCall> calls();
+    static std::vector<GlCall> callsNamed(const std::string& name);
+    static std::vector<std::string> names();  // names of all recorded calls in order
+    // Names in order, keeping only those in `filter`.
+    static std::vector<std::string> names(const std::vector<std::string>& filter);
+    static int count(const std::string& name);
+
+    // Makes glGetString(GL_RENDERER) answer `renderer` (null: the driver's own
+    // answer). For a test binary of its own: the runtime reads it once per process.
+    static void setRendererOverride(const char* renderer);
+
+    // Used by the wrappers.
+    static void record(const char* name, std::initializer_list<double> args, const char* text = nullptr);
+    static const char* rendererOverride();
+};
+
+// Records for the lifetime of the object.
+class GlRecording {
+public:
+    GlRecording() { GlRecorder::start(); }
+    ~GlRecording() { GlRecorder::stop(); }
+};
+
+}  // namespace vitest
