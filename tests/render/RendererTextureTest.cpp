@@ -1,0 +1,226 @@
+// Renderers with textures: sampler binding, render targets drawn before they
+// are sampled, and a textured quad read back pixel for pixel.
+#include <gtest/gtest.h>
+
+#include <glm/gtc/matrix_transform.hpp>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "GlContext.h"
+#include "GlRecorder.h"
+#include "Render/Drawable.h"
+#include "Render/GeometryRectangle.h"
+#include "Render/RenderableTexture.h"
+#include "Render/Renderer.h"
+#include "Render/ShaderProgram.h"
+#include "Render/Texture.h"
+
+using vitest::GlCall;
+using vitest::GlContext;
+using vitest::GlRecorder;
+using vitest::GlRecording;
+
+namespace {
+
+const char* const kQuadVertex =
+    "attribute vec3 aPosition;\n"
+    "attribute vec2 aTexCoord;\n"
+    "uniform mat4 uModelViewProjectionMatrix;\n"
+    "varying vec2 vTexCoord;\n"
+    "void main() {\n"
+    "  vTexCoord = aTexCoord;\n"
+    "  gl_Position = uModelViewProjectionMatrix * vec4(aPosition, 1.0);\n"
+    "}\n";
+const char* const kQuadFragment =
+    "precision mediump float;\n"
+    "uniform sampler2D uTexture;\n"
+    "varying vec2 vTexCoord;\n"
+    "void main() { gl_FragColor = texture2D(uTexture, vTexCoord); }\n";
+const char* const kTwoSamplersFragment =
+    "precision mediump float;\n"
+    "uniform sampler2D uFirst;\n"
+    "uniform sampler2D uSecond;\n"
+    "uniform vec2 uFirstSize;\n"
+    "uniform vec2 uFirstTexelSize;\n"
+    "uniform vec2 uSecondTexelSize;\n"
+    "varying vec2 vTexCoord;\n"
+    "void main() {\n"
+    "  gl_FragColor = texture2D(uFirst, vTexCoord * uFirstSize * uFirstTexelSize)\n"
+    "               + texture2D(uSecond, vTexCoord + uSecondTexelSize);\n"
+    "}\n";
+const char* const kFlatVertex =
+    "attribute vec3 aPosition;\n"
+    "void main() { gl_Position = vec4(aPosition, 1.0); }\n";
+const char* const kFlatFragment =
+    "precision mediump float;\n"
+    "void main() { gl_FragColor = vec4(1.0, 0.0, 0.0, 1.0); }\n";
+
+constexpr int kTexels = 4;
+
+// Distinct colour per texel, rows in memory order (row 0 first).
+std::vector<std::uint8_t> texelPattern() {
+    std::vector<std::uint8_t> pixels;
+    for (int y = 0; y < kTexels; ++y)
+        for (int x = 0; x < kTexels; ++x)
+            pixels.insert(pixels.end(), {std::uint8_t(10 + 60 * x), std::uint8_t(20 + 60 * y),
+                                         std::uint8_t(200 - 10 * x * y), 255});
+    return pixels;
+}
+
+std::uint32_t texel(const std::vector<std::uint8_t>& pixels, int x, int y) {
+    const std::uint8_t* p = &pixels[4 * (y * kTexels + x)];
+    return std::uint32_t(p[0]) << 24 | std::uint32_t(p[1]) << 16 | std::uint32_t(p[2]) << 8 | p[3];
+}
+
+std::uint32_t pixelAt(const std::vector<std::uint8_t>& frame, int width, int x, int y) {
+    const std::uint8_t* p = &frame[4 * (y * width + x)];
+    return std::uint32_t(p[0]) << 24 | std::uint32_t(p[1]) << 16 | std::uint32_t(p[2]) << 8 | p[3];
+}
+
+std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
+    std::vector<float> values(4, -99.0f);
+    glGetUniformfv(program, glGetUniformLocation(program, name), values.data());
+    values.resize(n);
+    return values;
+}
+
+// A quad over the whole viewport, drawn from a rectangle's arrays.
+struct ScreenQuad {
+    ScreenQuad() {
+        rectangle.construct(glm::vec3(-1.0f, -1.0f, 0.0f), glm::vec2(2.0f, 2.0f));
+        drawable.mode = rectangle.mode;
+        drawable.indices = rectangle.indices.data();
+        drawable.elementCount = unsigned(rectangle.indices.size());
+        drawable.vertexCount = unsigned(rectangle.positions.size());
+        drawable.positions = &rectangle.positions[0].x;
+        drawable.texCoords = &rectangle.texCoords[0].x;
+    }
+    vi::GeometryRectangle rectangle;
+    vi::Drawable drawable;
+};
+
+class RendererTextureTest : public ::testing::Test {
+protected:
+    void TearDown() override { GlRecorder::stop(); }
+
+    GlContext mGl{16, 16};
+};
+
+}  // namespace
+
+TEST_F(RendererTextureTest, SamplersGetUnitsInOrderWithSizeUniformsAndNullOrUnknownOnesAreDropped) {
+    vi::ShaderProgram program(kQuadVertex, kTwoSamplersFragment);
+    ScreenQuad quad;
+    vi::Renderer renderer(program, quad.drawable);
+    std::vector<std::uint8_t> pixels = texelPattern();
+    vi::Texture first(pixels.data(), 4, 2, true, false, false, false, false, 4, false);
+    vi::Texture second(pixels.data(), 2, 8, false, false, false, false, false, 4, false);
+    vi::Texture unused(pixels.data(), 2, 2, true, false, false, false, false, 4, false);
+    const size_t uniformsBefore = renderer.uniforms.size();
+
+    // Neither a null texture nor an unknown sampler leaves a trace.
+    EXPECT_EQ(renderer.addTexture("uFirst", nullptr), -1);
+    EXPECT_EQ(renderer.addTexture("uMissing", &unused), -1);
+    EXPECT_EQ(unused.mId, 0u);
+    EXPECT_EQ(renderer.addTexture("uFirst", &first), 0);
+    EXPECT_NE(first.mId, 0u);
+    EXPECT_EQ(renderer.addTexture("uSecond", &second), 1);
+    EXPECT_NE(second.mId, 0u);
+    EXPECT_TRUE(renderer.renderTargets.empty());
+    // uFirstSize, uFirstTexelSize and uSecondTexelSize: the program has no uSecondSize.
+    EXPECT_EQ(renderer.uniforms.size(), uniformsBefore + 3);
+
+    GlRecording recording;
+    renderer.render();
+    GlRecorder::stop();
+    const GLint firstLocation = glGetUniformLocation(program.program, "uFirst");
+    const GLint secondLocation = glGetUniformLocation(program.program, "uSecond");
+    const std::vector<GlCall> binds = GlRecorder::callsNamed("glUniform1i");
+    ASSERT_EQ(binds.size(), 2u);
+    EXPECT_EQ(binds[0].args, (std::vector<double>{double(firstLocation), 0}));
+    EXPECT_EQ(binds[1].args, (std::vector<double>{double(secondLocation), 1}));
+    const std::vector<GlCall> units = GlRecorder::callsNamed("glActiveTexture");
+    ASSERT_EQ(units.size(), 2u);
+    EXPECT_EQ(units[1].args[0], GL_TEXTURE1);
+    // Uniforms before textures, textures before the draw.
+    const std::vector<std::string> order =
+        GlRecorder::names({"glUniform2fv", "glActiveTexture", "glDrawElements"});
+    EXPECT_EQ(order, (std::vector<std::string>{"glUniform2fv", "glUniform2fv", "glUniform2fv", "glActiveTexture",
+                                               "glActiveTexture", "glDrawElements"}));
+
+    EXPECT_EQ(uniformFloats(program.program, "uFirstSize", 2), (std::vector<float>{4, 2}));
+    EXPECT_EQ(uniformFloats(program.program, "uFirstTexelSize", 2), (std::vector<float>{0.25f, 0.5f}));
+    EXPECT_EQ(uniformFloats(program.program, "uSecondTexelSize", 2), (std::vector<float>{0.5f, 0.125f}));
+}
+
+TEST_F(RendererTextureTest, DynamicRenderTargetsAreRedrawnBeforeTheDrawAndStaticOnesAreNot) {
+    vi::ShaderProgram flat(kFlatVertex, kFlatFragment);
+    vi::ShaderProgram sampling(kQuadVertex, kTwoSamplersFragment);
+    ScreenQuad quad;
+    vi::Renderer inner(flat, quad.drawable);
+    inner.addAttribute("aPosition", quad.drawable.positions, 3, true);
+    std::vector<vi::Renderer*> innerList = {&inner};
+    vi::RenderableTexture dynamicTarget(innerList, 0, 0, 4, 4, false, false, false, false, false);
+    vi::RenderableTexture staticTarget(innerList, 0, 0, 4, 4, true, false, false, false, false);
+    vi::Renderer outer(sampling, quad.drawable);
+    ASSERT_EQ(outer.addTexture("uFirst", &staticTarget), 0);
+    ASSERT_EQ(outer.addTexture("uSecond", &dynamicTarget), 1);
+    ASSERT_EQ(outer.renderTargets, (std::vector<vi::Texture*>{&staticTarget, &dynamicTarget}));
+
+    GlRecording recording;
+    outer.render();
+    GlRecorder::stop();
+    std::vector<std::string> seen;
+    for (const GlCall& call : GlRecorder::calls()) {
+        if (call.name == "glBindFramebuffer") {
+            const GLuint framebuffer = GLuint(call.args[1]);
+            seen.push_back(framebuffer == dynamicTarget.mFrameBuffer  ? "bind dynamic"
+                           : framebuffer == staticTarget.mFrameBuffer ? "bind static"
+                                                                      : "bind other");
+        } else if (call.name == "glUseProgram") {
+            seen.push_back(GLuint(call.args[0]) == flat.program ? "use inner" : "use outer");
+        } else if (call.name == "glDrawElements") {
+            seen.push_back("draw");
+        }
+    }
+    EXPECT_EQ(seen, (std::vector<std::string>{"bind dynamic", "use inner", "draw", "bind other", "use outer", "draw"}));
+}
+
+TEST_F(RendererTextureTest, TexturedQuadReadsBackAsTheTextureWithItsTopRowUp) {
+    vi::ShaderProgram program(kQuadVertex, kQuadFragment);
+    ScreenQuad quad;
+    std::vector<std::uint8_t> pixels = texelPattern();
+    vi::Texture texture(pixels.data(), kTexels, kTexels, true, false, false, false, false, 4, false);
+    vi::Renderer renderer(program, quad.drawable);
+    ASSERT_EQ(renderer.addAttribute("aPosition", quad.drawable.positions, 3, true), 0);
+    ASSERT_EQ(renderer.addAttribute("aTexCoord", quad.drawable.texCoords, 2, true), 1);
+    ASSERT_EQ(renderer.addTexture("uTexture", &texture), 0);
+
+    glClearColor(0.0f, 0.0f, 0.0f, 0.0f);
+    glClear(GL_COLOR_BUFFER_BIT);
+    renderer.render();
+    const int size = mGl.width();
+    std::vector<std::uint8_t> frame = vitest::readPixels(0, 0, size, size);
+    const int scale = size / kTexels;
+    for (int y = 0; y < size; ++y)
+        for (int x = 0; x < size; ++x)
+            ASSERT_EQ(pixelAt(frame, size, x, y), texel(pixels, x / scale, kTexels - 1 - y / scale))
+                << "pixel " << x << ", " << y;
+
+    // The model matrix reaches the screen through the derived matrix: squeeze
+    // the quad into the left half.
+    quad.drawable.modelMatrix =
+        glm::scale(glm::translate(glm::mat4(1.0f), glm::vec3(-0.5f, 0.0f, 0.0f)), glm::vec3(0.5f, 1.0f, 1.0f));
+    glClear(GL_COLOR_BUFFER_BIT);
+    renderer.render();
+    frame = vitest::readPixels(0, 0, size, size);
+    for (int y = 0; y < size; ++y) {
+        for (int x = 0; x < size; ++x) {
+            const std::uint32_t expected =
+                x < size / 2 ? texel(pixels, 2 * x / scale, kTexels - 1 - y / scale) : 0u;
+            ASSERT_EQ(pixelAt(frame, size, x, y), expected) << "pixel " << x << ", " << y;
+        }
+    }
+}

@@ -1,0 +1,178 @@
+// A steady frame allocates nothing: repeated draws of a renderer with
+// attributes, uniforms, plain, dynamic and curve textures and a dynamic
+// render target make no heap allocation after the first frame. This binary
+// replaces the global operator new (every caller counts) and malloc (only
+// calls made from this executable count: the GL driver's own bookkeeping is
+// not the runtime's business).
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cstdint>
+#include <cstdlib>
+#include <new>
+#include <vector>
+
+#include "GlContext.h"
+#include "Painters.h"
+#include "Render/Curves.h"
+#include "Render/RenderableTexture.h"
+#include "Render/Renderer.h"
+#include "Render/ShaderProgram.h"
+#include "Render/Texture.h"
+
+namespace {
+
+std::atomic<bool> gCounting{false};
+std::atomic<int> gNewCount{0};
+std::atomic<int> gMallocCount{0};
+
+void* countedNew(std::size_t size) {
+    if (gCounting) ++gNewCount;
+    if (void* p = std::malloc(size ? size : 1)) return p;
+    throw std::bad_alloc();
+}
+
+void* countedAlignedNew(std::size_t size, std::align_val_t alignment) {
+    if (gCounting) ++gNewCount;
+    void* p = nullptr;
+    if (posix_memalign(&p, std::max(sizeof(void*), std::size_t(alignment)), size ? size : 1) == 0) return p;
+    throw std::bad_alloc();
+}
+
+}  // namespace
+
+void* operator new(std::size_t size) { return countedNew(size); }
+void* operator new[](std::size_t size) { return countedNew(size); }
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+    if (gCounting) ++gNewCount;
+    return std::malloc(size ? size : 1);
+}
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
+    if (gCounting) ++gNewCount;
+    return std::malloc(size ? size : 1);
+}
+void* operator new(std::size_t size, std::align_val_t alignment) { return countedAlignedNew(size, alignment); }
+void* operator new[](std::size_t size, std::align_val_t alignment) { return countedAlignedNew(size, alignment); }
+void operator delete(void* p) noexcept { std::free(p); }
+void operator delete[](void* p) noexcept { std::free(p); }
+void operator delete(void* p, std::size_t) noexcept { std::free(p); }
+void operator delete[](void* p, std::size_t) noexcept { std::free(p); }
+void operator delete(void* p, std::align_val_t) noexcept { std::free(p); }
+void operator delete[](void* p, std::align_val_t) noexcept { std::free(p); }
+void operator delete(void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
+void operator delete[](void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
+
+// The sanitizers own malloc; there the operator new count alone applies.
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
+extern "C" {
+extern char __executable_start;
+extern char etext;
+void* __libc_malloc(std::size_t size);
+
+void* malloc(std::size_t size) {
+    const char* caller = static_cast<const char*>(__builtin_return_address(0));
+    if (gCounting && caller >= &__executable_start && caller < &etext) ++gMallocCount;
+    return __libc_malloc(size);
+}
+}
+#endif
+
+namespace {
+
+const char* const kVertex =
+    "attribute vec2 aPosition;\n"
+    "attribute vec2 aOffset;\n"
+    "uniform mat4 uModelViewProjectionMatrix;\n"
+    "varying vec2 vUv;\n"
+    "void main() {\n"
+    "  vUv = aPosition * 0.5 + 0.5;\n"
+    "  gl_Position = uModelViewProjectionMatrix * vec4(aPosition + aOffset, 0.0, 1.0);\n"
+    "}\n";
+const char* const kFragment =
+    "precision mediump float;\n"
+    "uniform sampler2D uPicture;\n"
+    "uniform sampler2D uLive;\n"
+    "uniform sampler2D uCurve;\n"
+    "uniform sampler2D uTarget;\n"
+    "uniform vec4 uTint;\n"
+    "uniform float uMix;\n"
+    "uniform int uMode;\n"
+    "varying vec2 vUv;\n"
+    "void main() {\n"
+    "  vec4 c = texture2D(uPicture, vUv) * uTint + texture2D(uLive, vUv) * uMix;\n"
+    "  c.r = texture2D(uCurve, vec2(0.5, c.r)).r;\n"
+    "  gl_FragColor = mix(c, texture2D(uTarget, vUv), float(uMode) * 0.5);\n"
+    "}\n";
+
+TEST(SteadyFrame, AllocatesNothingAfterTheFirstFrame) {
+    vitest::GlContext context(32, 32);
+    vi::RenderableTexture::mCurrentFrameBufferSize = glm::ivec2(32, 32);
+
+    std::vector<std::uint8_t> picture(4 * 4 * 4, 200);
+    std::vector<std::uint8_t> live(4 * 4 * 4, 30);
+    vi::Texture pictureTexture(picture.data(), 4, 4, true, true, false, true, false, 4, false);
+    vi::Texture liveTexture(live.data(), 4, 4, false, false, false, false, false, 4, false);
+    const glm::vec2 curvePoints[] = {{0, 20}, {255, 230}};
+    vi::Curves curves(curvePoints, 2, curvePoints, 2, curvePoints, 2);
+
+    vitest::ColourPainter targetPainter(glm::vec4(0.2f, 0.4f, 0.6f, 1.0f));
+    std::vector<vi::Renderer*> targetRenderers = {targetPainter.renderer()};
+    vi::RenderableTexture target(targetRenderers, 0, 0, 8, 8, false, false, false, true, true);
+
+    vitest::Quad quad;
+    float offsets[8] = {};
+    vi::ShaderProgram program(kVertex, kFragment);
+    vi::Renderer renderer(program, quad);
+    ASSERT_GE(renderer.addAttribute("aPosition", quad.positions, 2, true), 0);
+    ASSERT_GE(renderer.addAttribute("aOffset", offsets, 2, false), 0);
+    glm::vec4 tint(1.0f);
+    float mixing = 0.5f;
+    int mode = 1;
+    ASSERT_GE(renderer.addUniform("uTint", &tint[0], vi::Uniform::Float4, 1), 0);
+    ASSERT_GE(renderer.addUniform("uMix", &mixing, vi::Uniform::Float, 1), 0);
+    ASSERT_GE(renderer.addUniform("uMode", &mode, vi::Uniform::Int, 1), 0);
+    ASSERT_EQ(renderer.addTexture("uPicture", &pictureTexture), 0);
+    ASSERT_EQ(renderer.addTexture("uLive", &liveTexture), 1);
+    ASSERT_EQ(renderer.addTexture("uCurve", curves.getTexture()), 2);
+    ASSERT_EQ(renderer.addTexture("uTarget", &target), 3);
+    ASSERT_EQ(renderer.renderTargets.size(), 1u);
+
+    renderer.render();  // the first frame may set things up
+
+    gCounting = true;
+    for (int frame = 0; frame < 20; ++frame) {
+        tint.g = 0.05f * float(frame);
+        live[0] = std::uint8_t(frame);
+        offsets[0] = 0.01f * float(frame);
+        targetPainter.colour.r = 0.04f * float(frame);
+        renderer.render();
+    }
+    glFinish();
+    gCounting = false;
+
+    EXPECT_EQ(gNewCount.load(), 0);
+    EXPECT_EQ(gMallocCount.load(), 0);
+}
+
+// The counters themselves must see what they are meant to see.
+std::vector<int>* volatile gMade;
+void* volatile gRaw;
+
+TEST(SteadyFrame, CountersNoticeAllocations) {
+    gCounting = true;
+    gMade = new std::vector<int>(3);
+    gCounting = false;
+    EXPECT_GE(gNewCount.load(), 1);
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
+    gMallocCount = 0;
+    gCounting = true;
+    gRaw = std::malloc(16);
+    gCounting = false;
+    EXPECT_EQ(gMallocCount.load(), 1);
+#endif
+    std::free(gRaw);
+    delete gMade;
+}
+
+}  // namespace

@@ -1,0 +1,145 @@
+// Tone curves: the table the segments write (worked values, clamping,
+// truncation, shared joints, untouched bytes) and the texture over it.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <cstring>
+#include <new>
+#include <vector>
+
+#include "GlContext.h"
+#include "Render/Curves.h"
+#include "Render/Texture.h"
+#include "SamplerProbe.h"
+
+using glm::vec2;
+
+namespace {
+
+int texel(const vi::Curves& curves, int x, int channel) { return curves.mTable[4 * x + channel]; }
+
+TEST(CurvesTable, StraightDiagonalGivesTheWorkedValues) {
+    const vec2 diagonal[] = {{0, 0}, {255, 255}};
+    vi::Curves curves(diagonal, 2, nullptr, 0, nullptr, 0);
+    const int xs[] = {0, 1, 64, 128, 192, 254, 255};
+    const int expected[] = {0, 0, 52, 128, 203, 254, 255};
+    for (int i = 0; i < 7; ++i) EXPECT_EQ(texel(curves, xs[i], vi::Curves::RED), expected[i]) << "texel " << xs[i];
+    // Monotonic from end to end: every texel was written.
+    for (int x = 1; x < 256; ++x) EXPECT_GE(texel(curves, x, 0), texel(curves, x - 1, 0));
+}
+
+TEST(CurvesTable, ValuesAreClampedToAByte) {
+    const vec2 high[] = {{0, 300}, {10, 300}};
+    const vec2 low[] = {{0, -20}, {10, -20}};
+    vi::Curves curves(nullptr, 0, high, 2, low, 2);
+    for (int x = 0; x <= 10; ++x) {
+        EXPECT_EQ(texel(curves, x, vi::Curves::GREEN), 255) << x;
+        EXPECT_EQ(texel(curves, x, vi::Curves::BLUE), 0) << x;
+    }
+}
+
+TEST(CurvesTable, EachSegmentUsesOnlyItsOwnEndsAndJointsAreShared) {
+    const vec2 points[] = {{0, 0}, {128, 200}, {255, 40}};
+    vi::Curves curves(nullptr, 0, nullptr, 0, points, 3);
+    EXPECT_EQ(texel(curves, 0, vi::Curves::BLUE), 0);
+    EXPECT_EQ(texel(curves, 128, vi::Curves::BLUE), 200);
+    EXPECT_EQ(texel(curves, 255, vi::Curves::BLUE), 40);
+    // No overshoot past either end of a segment, as neighbours would cause.
+    for (int x = 0; x <= 128; ++x) EXPECT_LE(texel(curves, x, vi::Curves::BLUE), 200) << x;
+    for (int x = 128; x <= 255; ++x) EXPECT_GE(texel(curves, x, vi::Curves::BLUE), 40) << x;
+    // Midway through the first segment: t = 64/128 gives 200 * 0.5 exactly.
+    EXPECT_EQ(texel(curves, 64, vi::Curves::BLUE), 100);
+}
+
+TEST(CurvesTable, FractionalEndsCoverTheTruncatedTexelRange) {
+    const vec2 points[] = {{10.7f, 100}, {20.2f, 200}};
+    vi::Curves curves(points, 2, nullptr, 0, nullptr, 0);
+    EXPECT_EQ(texel(curves, 9, vi::Curves::RED), 0);
+    EXPECT_EQ(texel(curves, 10, vi::Curves::RED), 100);
+    for (int x = 11; x <= 20; ++x) EXPECT_GT(texel(curves, x, vi::Curves::RED), 100) << x;
+    EXPECT_EQ(texel(curves, 20, vi::Curves::RED), 200);
+    EXPECT_EQ(texel(curves, 21, vi::Curves::RED), 0);
+}
+
+TEST(CurvesTable, ShortListsAndOtherBytesAreLeftAlone) {
+    const vec2 ramp[] = {{0, 255}, {255, 255}};
+    // The table is zeroed before the first computation, whatever the storage held.
+    alignas(vi::Curves) unsigned char storage[sizeof(vi::Curves)];
+    std::memset(storage, 0xAB, sizeof(storage));
+    vi::Curves* curves = new (storage) vi::Curves(ramp, 2, nullptr, 0, ramp, 1);
+    for (int x = 0; x < 256; ++x) {
+        ASSERT_EQ(texel(*curves, x, vi::Curves::RED), 255);
+        ASSERT_EQ(texel(*curves, x, vi::Curves::GREEN), 0);
+        ASSERT_EQ(texel(*curves, x, vi::Curves::BLUE), 0);
+        ASSERT_EQ(texel(*curves, x, 3), 0);
+    }
+
+    // A later computation with one point for red and none for green keeps
+    // both channels; a texture made earlier is not deleted by it.
+    vi::Texture* first = curves->getTexture();
+    const vec2 single[] = {{128, 0}};
+    const vec2 blue[] = {{0, 9}, {3, 9}};
+    curves->calculateCatmullRomPoints(single, 1, nullptr, 0, blue, 2);
+    EXPECT_NE(curves->getTexture(), first);
+    for (int x = 0; x < 256; ++x) ASSERT_EQ(texel(*curves, x, vi::Curves::RED), 255) << x;
+    EXPECT_EQ(texel(*curves, 3, vi::Curves::BLUE), 9);
+    EXPECT_EQ(texel(*curves, 4, vi::Curves::BLUE), 0);
+    delete first;
+    curves->~Curves();
+}
+
+TEST(CurvesTable, GeneralSegmentWritesEveryFourthByteOfItsChannel) {
+    vi::Curves curves(nullptr, 0, nullptr, 0, nullptr, 0);
+    // Bytes 8..27 are texels 2..6: five green values, t = 0, 1/4, ... 1 from b = 40 to c = 240.
+    curves.calculateCatmullRomPoint(8, 28, vec2(0, 40), vec2(0, 40), vec2(0, 240), vec2(0, 240),
+                                    vi::Curves::GREEN);
+    const int expected[] = {40, 80, 140, 199, 240};
+    for (int i = 0; i < 5; ++i) EXPECT_EQ(curves.mTable[8 + 1 + 4 * i], expected[i]) << i;
+    EXPECT_EQ(curves.mTable[8], 0);
+    EXPECT_EQ(curves.mTable[28 + 1], 0);
+    // An empty span writes nothing.
+    curves.calculateCatmullRomPoint(40, 40, vec2(0, 99), vec2(0, 99), vec2(0, 99), vec2(0, 99), vi::Curves::RED);
+    EXPECT_EQ(curves.mTable[40], 0);
+}
+
+TEST(CurvesTexture, IsADynamicOneByTwoHundredFiftySixTextureOverTheTable) {
+    const std::size_t before = vi::Texture::mAllTextures.size();
+    {
+        const vec2 points[] = {{0, 0}, {255, 255}};
+        vi::Curves curves(points, 2, points, 2, points, 2);
+        vi::Texture* texture = curves.getTexture();
+        ASSERT_NE(texture, nullptr);
+        EXPECT_EQ(texture->mBuffer, static_cast<void*>(curves.mTable));
+        EXPECT_EQ(texture->mWidth, 1u);
+        EXPECT_EQ(texture->mHeight, 256u);
+        EXPECT_FALSE(texture->mIsStatic);
+        EXPECT_TRUE(texture->mIsRepeat);
+        EXPECT_FALSE(texture->mIsMirrored);
+        EXPECT_TRUE(texture->mIsLinear);
+        EXPECT_FALSE(texture->mIsCompressed);
+        EXPECT_FALSE(texture->mIsDeletable);
+        EXPECT_EQ(texture->mFormat, GLenum(GL_RGBA));
+        EXPECT_EQ(texture->mId, 0u);
+        EXPECT_EQ(vi::Texture::mAllTextures.size(), before + 1);
+    }
+    EXPECT_EQ(vi::Texture::mAllTextures.size(), before);
+}
+
+TEST(CurvesTexture, SamplesToTheTableAndShowsLaterEdits) {
+    vitest::GlContext context(4, 256);
+    const vec2 red[] = {{0, 0}, {255, 255}};
+    const vec2 green[] = {{0, 255}, {100, 30}, {255, 180}};
+    const vec2 blue[] = {{20, 60}, {200, 250}};
+    vi::Curves curves(red, 2, green, 3, blue, 2);
+    curves.getTexture()->allocate();
+    vitest::SamplerProbe probe(vitest::SamplerProbe::Flat);
+
+    std::vector<std::uint32_t> sampled = probe.draw(*curves.getTexture(), 1, 256);
+    for (int x = 0; x < 256; ++x) ASSERT_EQ(sampled[std::size_t(x)], vitest::rgba(&curves.mTable[4 * x])) << x;
+
+    curves.mTable[4 * 77 + 3] = 0x5A;
+    sampled = probe.draw(*curves.getTexture(), 1, 256);
+    EXPECT_EQ(sampled[77] & 0xFF, 0x5Au);
+}
+
+}  // namespace
