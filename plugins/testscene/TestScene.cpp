@@ -1,0 +1,179 @@
+// The recording scene. Every operation notes itself with the scene members it
+// sees; an atomic flag notices a call that begins while another is running.
+#include <GLES2/gl2.h>
+
+#include <atomic>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "Application/AnimationManager.h"
+#include "Application/Scene.h"
+#include "TestSceneRecord.h"
+
+namespace {
+
+struct Config {
+    std::vector<std::string> names;
+    int drawResult = 0;
+    int initialOrientation = 0;
+    bool clear = false;
+    float clearColour[4] = {0.0f, 0.0f, 0.0f, 0.0f};
+};
+
+Config gConfig;
+std::vector<TestSceneEvent> gEvents;
+int gCounts[TestSceneEventKindCount];
+int gSerial = 0;
+void* gLastModels = nullptr;
+void* gLastTextures = nullptr;
+std::atomic<bool> gInside(false);
+std::atomic<int> gOverlaps(0);
+
+// Marks the time spent inside the scene. Gives up the processor once inside,
+// so that a call let in without the lock would find the flag set.
+class Inside {
+public:
+    Inside() {
+        if (gInside.exchange(true)) ++gOverlaps;
+        std::this_thread::yield();
+    }
+    ~Inside() { gInside.store(false); }
+};
+
+class RecordingScene : public vi::Scene {
+public:
+    RecordingScene(const int* size, int factory) : vi::Scene(size), mSerial(++gSerial), mFactory(factory) {
+        mOrientation = static_cast<vi::Orientation::OrientationEnum>(gConfig.initialOrientation);
+        mNames = gConfig.names;
+        record(TestSceneCreated, size[0], size[1]);
+    }
+    ~RecordingScene() override {
+        Inside inside;
+        record(TestSceneDestroyed);
+    }
+
+    void clearEffect() override { note(TestSceneClearEffect); }
+    void affordance() override { note(TestSceneAffordance); }
+    void unlock() override { note(TestSceneUnlock); }
+    void textureUpdated() override { note(TestSceneTextureUpdated); }
+    void initEffect() override { note(TestSceneInitEffect); }
+    void initEffectAlternate() override { note(TestSceneInitEffectAlternate); }
+    int draw() override {
+        Inside inside;
+        record(TestSceneDraw);
+        if (gConfig.clear) {
+            glClearColor(gConfig.clearColour[0], gConfig.clearColour[1], gConfig.clearColour[2], gConfig.clearColour[3]);
+            glClear(GL_COLOR_BUFFER_BIT);
+        }
+        return gConfig.drawResult;
+    }
+    void touchDown(const glm::vec2& position) override { noteTouch(TestSceneTouchDown, position); }
+    void touchUp(const glm::vec2& position) override { noteTouch(TestSceneTouchUp, position); }
+    void touchMove(const glm::vec2& position) override { noteTouch(TestSceneTouchMove, position); }
+    void keyPressed(unsigned int key) override {
+        Inside inside;
+        record(TestSceneKeyPressed, int(key));
+    }
+    void param(int a, int b) override {
+        Inside inside;
+        record(TestSceneParam, a, b);
+    }
+
+private:
+    void note(int kind) {
+        Inside inside;
+        record(kind);
+    }
+    void noteTouch(int kind, const glm::vec2& position) {
+        Inside inside;
+        record(kind, 0, 0, position.x, position.y);
+    }
+    void record(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
+        TestSceneEvent event;
+        event.kind = kind;
+        event.scene = mSerial;
+        event.factory = mFactory;
+        event.a = a;
+        event.b = b;
+        event.x = x;
+        event.y = y;
+        event.sizeX = mSize.x;
+        event.sizeY = mSize.y;
+        event.aspect = mAspect;
+        event.scaleX = mScale.x;
+        event.scaleY = mScale.y;
+        event.orientation = int(mOrientation);
+        event.initialised0 = mInitialised[0];
+        event.initialised1 = mInitialised[1];
+        event.now = vi::AnimationManager::mNow;
+        gEvents.push_back(event);
+        ++gCounts[kind];
+    }
+
+    int mSerial;
+    int mFactory;
+};
+
+vi::Scene* create(int* size, vi::ModelsMap* models, vi::TexturesMap* textures, int factory) {
+    Inside inside;
+    gLastModels = models;
+    gLastTextures = textures;
+    return new RecordingScene(size, factory);
+}
+
+}  // namespace
+
+extern "C" {
+
+TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures) {
+    return create(size, models, textures, 1);
+}
+
+// Not looked up by the runtime: a test puts it into vi::gCreateScene to tell
+// which factory made a scene.
+TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures) {
+    return create(size, models, textures, 2);
+}
+
+void testSceneClearEvents(void) {
+    gEvents.clear();
+    for (int& count : gCounts) count = 0;
+    gOverlaps = 0;
+}
+
+void testSceneReset(void) {
+    testSceneClearEvents();
+    gConfig = Config();
+    gSerial = 0;
+    gLastModels = nullptr;
+    gLastTextures = nullptr;
+}
+
+void testSceneSetNames(const char* const* names, int count) { gConfig.names.assign(names, names + count); }
+void testSceneSetDrawResult(int result) { gConfig.drawResult = result; }
+void testSceneSetInitialOrientation(int orientation) { gConfig.initialOrientation = orientation; }
+
+void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha) {
+    gConfig.clear = enabled != 0;
+    gConfig.clearColour[0] = red;
+    gConfig.clearColour[1] = green;
+    gConfig.clearColour[2] = blue;
+    gConfig.clearColour[3] = alpha;
+}
+
+int testSceneEventCount(void) { return int(gEvents.size()); }
+TestSceneEvent testSceneEventAt(int index) {
+    if (index < 0 || std::size_t(index) >= gEvents.size()) {
+        TestSceneEvent none = {};
+        none.kind = -1;
+        return none;
+    }
+    return gEvents[std::size_t(index)];
+}
+int testSceneCount(int kind) { return gCounts[kind]; }
+int testSceneOverlaps(void) { return gOverlaps; }
+void* testSceneLastModelsMap(void) { return gLastModels; }
+void* testSceneLastTexturesMap(void) { return gLastTextures; }
+
+}  // extern "C"

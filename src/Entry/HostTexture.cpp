@@ -1,0 +1,85 @@
+// The host's texture loading: images handed in as Java int pixels, filed by
+// name in the shared textures map for the scene to find. Takes no lock, on
+// purpose: the host calls it on its render thread and never while another
+// thread is inside a handler. Runs the context check first because the
+// replace path uploads through GL at once.
+#include <jni.h>
+
+#include <cstdlib>
+#include <string>
+
+#include <glm/glm.hpp>
+
+#include "Application/ApplicationVar.h"
+#include "Application/ContextRecovery.h"
+#include "Application/Scene.h"
+#include "Entry/HostImage.h"
+#include "Render/Texture.h"
+
+namespace {
+
+// A host image as a texture: uploaded once, plain repeat, linear, RGBA bytes.
+// No GL work: the context recovery or the scene allocates it before first use.
+void fileNewTexture(const std::string& name, void* buffer, unsigned int width, unsigned int height) {
+    vi::ApplicationVar::msTexturesMap[name] = new vi::Texture(buffer, width, height, true, true, false, true,
+                                                              false, 4, false);
+    vi::ApplicationVar::msTexturesMap[name]->setDeletable(true);
+}
+
+// Keeps the texture object, its GL name and its registry entry, so that
+// renderers bound to it draw the new pixels. The deletable flag stays as it was.
+void replacePixels(vi::Texture& texture, void* buffer, unsigned int width, unsigned int height) {
+    if (texture.mIsDeletable) std::free(texture.mBuffer);
+    texture.mBuffer = buffer;
+    texture.mWidth = width;
+    texture.mHeight = height;
+    // Cleared so that the upload below defines the GL storage at the new size.
+    texture.mIsUploaded = false;
+    texture.mSize = glm::vec2(float(width), float(height));
+    texture.mTexelSize = glm::vec2(1.0f / float(width), 1.0f / float(height));
+    texture.update();
+    // A texture not yet allocated has no GL name: the upload above went to the
+    // default texture and defined nothing of its own. Its first allocate() must
+    // then define the storage in full, not re-upload into storage it lacks.
+    if (texture.mId == 0) texture.mIsUploaded = false;
+    if (vi::gpScene) vi::gpScene->textureUpdated();
+}
+
+// The entry is neither erased nor reset: it keeps the pointer to the deleted
+// texture, on purpose. The host unloads a name only when it will load it no more.
+void unload(const std::string& name) {
+    vi::Texture* texture = vi::ApplicationVar::msTexturesMap[name];
+    if (texture) delete texture;
+}
+
+}  // namespace
+
+extern "C" JNIEXPORT void JNICALL Java_com_tarq_android_visualeffect_common_Native_loadTexture(
+    JNIEnv* env, jclass, jstring name, jintArray pixels, jint width, jint height) {
+    vi::ContextRecovery::recoverIfContextChanged();
+    const char* chars = env->GetStringUTFChars(name, nullptr);
+    const std::string key(chars);
+
+    if (!pixels) {
+        unload(key);
+    } else {
+        // Nothing is checked: not malloc, not the array's length against the size.
+        const unsigned int w = static_cast<unsigned int>(width);
+        const unsigned int h = static_cast<unsigned int>(height);
+        const unsigned int count = w * h;
+        void* buffer = std::malloc(std::size_t(count) * 4);
+        jint* elements = env->GetIntArrayElements(pixels, nullptr);
+        // The host's own array is converted too: released with mode 0 below,
+        // it is left with red and blue exchanged, as the host expects.
+        vi::HostImage::toTextureBytes(elements, buffer, count);
+
+        vi::Texture* filed = vi::ApplicationVar::msTexturesMap[key];
+        if (!filed)
+            fileNewTexture(key, buffer, w, h);
+        else
+            replacePixels(*filed, buffer, w, h);
+        env->ReleaseIntArrayElements(pixels, elements, 0);
+    }
+
+    env->ReleaseStringUTFChars(name, chars);
+}

@@ -1,0 +1,228 @@
+// Starting, initialising, re-orienting, restarting and stopping the scene, and
+// the host's one-shot events.
+#include <cstring>
+
+#include "GlContext.h"
+#include "RecordedScene.h"
+#include "Render/Renderer.h"
+
+using namespace apptest;
+using vi::Application;
+using vi::ApplicationVar;
+
+namespace {
+
+bool sameTime(const timespec& a, const timespec& b) { return a.tv_sec == b.tv_sec && a.tv_nsec == b.tv_nsec; }
+
+// A starting point no restart can produce, to see whether one happened.
+const timespec kLongAgo = {1, 0};
+
+}  // namespace
+
+using Lifecycle = RecordedScene;
+
+TEST_F(Lifecycle, StartClampsTheWindowAndGivesTheFactoryTheSizeAndBothMaps) {
+    const char* names[] = {"sky", "glass"};
+    testSceneSetNames(names, 2);
+    std::vector<std::string>& returned = Application::handleStart(5, 7, 0, -3);
+    EXPECT_EQ(ApplicationVar::msWindowLeft, 5);
+    EXPECT_EQ(ApplicationVar::msWindowTop, 7);
+    EXPECT_EQ(ApplicationVar::msWindowWidth, 1);
+    EXPECT_EQ(ApplicationVar::msWindowHeight, 1);
+    const std::vector<TestSceneEvent> created = eventsOf(TestSceneCreated);
+    ASSERT_EQ(created.size(), 1u);
+    EXPECT_EQ(created[0].a, 1);
+    EXPECT_EQ(created[0].b, 1);
+    EXPECT_EQ(testSceneLastModelsMap(), &ApplicationVar::msModelsMap);
+    EXPECT_EQ(testSceneLastTexturesMap(), &ApplicationVar::msTexturesMap);
+    ASSERT_NE(vi::gpScene, nullptr);
+    EXPECT_EQ(&returned, &vi::gpScene->mNames);
+    EXPECT_EQ(returned, (std::vector<std::string>{"sky", "glass"}));
+}
+
+TEST_F(Lifecycle, StartDeletesTheOldSceneAndLeavesTheNewOneUnready) {
+    startReadyScene();
+    testSceneSetDrawResult(3);
+    Application::handleStart(0, 0, 540, 960);
+    EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneDestroyed, TestSceneCreated}));
+    EXPECT_EQ(allEvents()[0].scene, 1);
+    EXPECT_EQ(allEvents()[1].scene, 2);
+    EXPECT_FALSE(Application::isReady());
+    EXPECT_EQ(Application::handleDraw(), 0);
+    Application::handleInitEffect();
+    EXPECT_EQ(Application::handleDraw(), 3);
+}
+
+TEST_F(Lifecycle, InitialisingTwiceInitialisesOnceButRestartsTheClockBothTimes) {
+    Application::handleStart(0, 0, 540, 960);
+    vi::Timer::mStartingCnt = kLongAgo;
+    Application::handleInitEffect();
+    EXPECT_FALSE(sameTime(vi::Timer::mStartingCnt, kLongAgo));
+    vi::Timer::mStartingCnt = kLongAgo;
+    Application::handleInitEffect();
+    EXPECT_FALSE(sameTime(vi::Timer::mStartingCnt, kLongAgo));
+    EXPECT_EQ(testSceneCount(TestSceneInitEffect), 1);
+    EXPECT_EQ(testSceneCount(TestSceneInitEffectAlternate), 0);
+    EXPECT_TRUE(vi::gpScene->mInitialised[0]);
+    EXPECT_FALSE(vi::gpScene->mInitialised[1]);
+}
+
+TEST_F(Lifecycle, InitialisationWithoutASceneDoesNothing) {
+    vi::Timer::mStartingCnt = kLongAgo;
+    Application::handleInitEffect();
+    EXPECT_TRUE(sameTime(vi::Timer::mStartingCnt, kLongAgo));
+    EXPECT_EQ(vi::gpScene, nullptr);
+}
+
+TEST_F(Lifecycle, SceneStartingInTheAlternateOrientationIsInitialisedForIt) {
+    testSceneSetInitialOrientation(1);
+    Application::handleStart(0, 0, 540, 960);
+    Application::handleInitEffect();
+    EXPECT_EQ(testSceneCount(TestSceneInitEffectAlternate), 1);
+    EXPECT_EQ(testSceneCount(TestSceneInitEffect), 0);
+    EXPECT_TRUE(vi::gpScene->mInitialised[1]);
+    EXPECT_TRUE(Application::isReady());
+}
+
+TEST_F(Lifecycle, SameOrientationOnlyAdvancesTheClock) {
+    startReadyScene();
+    vi::gpScene->mAspect = 5.0f;
+    vi::gpScene->mScale = glm::vec2(6.0f, 7.0f);
+    vi::AnimationManager::mNow = -1.0f;
+    Application::handleSetOrientation(vi::Orientation::Initial);
+    EXPECT_GE(vi::AnimationManager::mNow, 0.0f);
+    EXPECT_EQ(vi::gpScene->mAspect, 5.0f);
+    EXPECT_EQ(vi::gpScene->mScale, glm::vec2(6.0f, 7.0f));
+    EXPECT_EQ(testSceneEventCount(), 0);
+}
+
+TEST_F(Lifecycle, SwitchingOrientationDerivesAspectAndScaleFromTheSceneSize) {
+    struct Case {
+        int width, height;
+        float aspect;
+        glm::vec2 scale;
+    };
+    for (const Case& c : {Case{540, 960, 0.5625f, glm::vec2(1.0f, 1.7777778f)},
+                          Case{960, 540, 1.7777778f, glm::vec2(1.7777778f, 1.0f)}}) {
+        startReadyScene(c.width, c.height);
+        vi::gpScene->mAspect = 5.0f;
+        vi::gpScene->mScale = glm::vec2(6.0f, 7.0f);
+        // The window is never read for this.
+        Application::handleWindowRectangle(0, 0, 100, 100);
+        Application::handleSetOrientation(vi::Orientation::Alternate);
+        EXPECT_EQ(vi::gpScene->mOrientation, vi::Orientation::Alternate);
+        EXPECT_FLOAT_EQ(vi::gpScene->mAspect, c.aspect);
+        EXPECT_FLOAT_EQ(vi::gpScene->mScale.x, c.scale.x);
+        EXPECT_FLOAT_EQ(vi::gpScene->mScale.y, c.scale.y);
+        EXPECT_EQ(testSceneEventCount(), 0) << "no initialisation on a switch";
+    }
+}
+
+TEST_F(Lifecycle, SwitchToAnUninitialisedOrientationUnreadiesUntilInitialisedAndBackIsReadyAtOnce) {
+    startReadyScene();
+    Application::handleSetOrientation(vi::Orientation::Alternate);
+    EXPECT_EQ(Application::handleDraw(), 0);
+    Application::handleParam(1, 2);
+    EXPECT_EQ(testSceneEventCount(), 0);
+    Application::handleInitEffect();
+    EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneInitEffectAlternate}));
+    Application::handleSetOrientation(vi::Orientation::Initial);
+    Application::handleDraw();
+    EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneInitEffectAlternate, TestSceneDraw}));
+    EXPECT_EQ(allEvents()[1].orientation, 0);
+}
+
+TEST_F(Lifecycle, OrientationNeedsASceneButNotAReadyOne) {
+    Application::handleSetOrientation(vi::Orientation::Alternate);
+    EXPECT_EQ(vi::gpScene, nullptr);
+    Application::handleStart(0, 0, 540, 960);
+    Application::handleSetOrientation(vi::Orientation::Alternate);
+    EXPECT_EQ(vi::gpScene->mOrientation, vi::Orientation::Alternate);
+}
+
+TEST_F(Lifecycle, RestartMakesAFreshSceneForTheCurrentWindowAndInitialisesIt) {
+    startReadyScene();
+    Application::handleWindowRectangle(3, 4, 300, 400);
+    Application::handleRestart();
+    EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneDestroyed, TestSceneCreated, TestSceneInitEffect}));
+    EXPECT_EQ(allEvents()[1].a, 300);
+    EXPECT_EQ(allEvents()[1].b, 400);
+    EXPECT_EQ(ApplicationVar::msWindowLeft, 3);
+    EXPECT_EQ(ApplicationVar::msWindowTop, 4);
+    EXPECT_TRUE(Application::isReady());
+}
+
+TEST_F(Lifecycle, StopAndDestroySceneDeleteTheSceneAndDropLaterEvents) {
+    for (void (*stop)() : {&Application::handleStop, &Application::destroyScene}) {
+        startReadyScene();
+        stop();
+        EXPECT_EQ(vi::gpScene, nullptr);
+        EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneDestroyed}));
+        EXPECT_EQ(Application::handleDraw(), 0);
+        Application::handleUnlock();
+        stop();
+        EXPECT_EQ(testSceneEventCount(), 1);
+    }
+}
+
+TEST_F(Lifecycle, OneShotEventsReachOnlyAReadySceneAfterTheClock) {
+    Application::handleStart(0, 0, 540, 960);
+    Application::handleClearEffect();
+    Application::handleAffordance();
+    Application::handleUnlock();
+    Application::handleParam(1, 2);
+    EXPECT_EQ(testSceneCount(TestSceneCreated), 1);
+    EXPECT_EQ(testSceneEventCount(), 1);
+
+    Application::handleInitEffect();
+    testSceneClearEvents();
+    vi::AnimationManager::mNow = -1.0f;
+    Application::handleAffordance();
+    Application::handleUnlock();
+    Application::handleParam(-5, 123456789);
+    const std::vector<TestSceneEvent> events = allEvents();
+    ASSERT_EQ(kindsOf(events),
+              (std::vector<int>{TestSceneClearEffect, TestSceneAffordance, TestSceneUnlock, TestSceneParam}));
+    for (const TestSceneEvent& event : events) EXPECT_GE(event.now, 0.0f);
+    EXPECT_EQ(events[3].a, -5);
+    EXPECT_EQ(events[3].b, 123456789);
+}
+
+TEST_F(Lifecycle, ClearEffectRestartsTheClockAfterTheScene) {
+    startReadyScene();
+    vi::Timer::mStartingCnt = kLongAgo;
+    vi::AnimationManager::mNow = -1.0f;
+    Application::handleClearEffect();
+    const std::vector<TestSceneEvent> events = allEvents();
+    ASSERT_EQ(kindsOf(events), (std::vector<int>{TestSceneClearEffect}));
+    EXPECT_EQ(events[0].now, -1.0f) << "the clock is not advanced before the scene clears";
+    EXPECT_FALSE(sameTime(vi::Timer::mStartingCnt, kLongAgo));
+    EXPECT_GE(vi::AnimationManager::mNow, 0.0f);
+}
+
+// Start and stop only notice a replaced context; a frame notices it only when
+// the scene is ready.
+TEST_F(Lifecycle, StartStopAndReadyFramesAdoptTheCurrentContext) {
+    vitest::GlContext gl(8, 8);
+    vi::Renderer::mEglContext = nullptr;
+    Application::handleStop();
+    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
+
+    vi::Renderer::mEglContext = nullptr;
+    Application::handleStart(0, 0, 540, 960);
+    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
+
+    vi::Renderer::mEglContext = nullptr;
+    Application::handleDraw();
+    EXPECT_EQ(vi::Renderer::mEglContext, nullptr);
+    Application::handleInitEffect();
+    Application::handleDraw();
+    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
+
+    vi::Renderer::mEglContext = nullptr;
+    Application::destroyScene();
+    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
+    vitest::GlContext::releaseCurrent();
+    Application::handleStop();
+    EXPECT_EQ(vi::Renderer::mEglContext, nullptr);
+}
