@@ -1,0 +1,143 @@
+#include "ConverterTool.h"
+
+#include <limits>
+#include <sstream>
+#include <utility>
+
+#include "MeshImporter.h"
+#include "ModelFile.h"
+#include "UvProjection.h"
+
+namespace vi {
+
+namespace {
+
+const char* const kTool = "vi-modelconv: ";
+
+std::string formatVec3(const glm::vec3& v) {
+    std::ostringstream text;
+    text << "(" << v.x << ", " << v.y << ", " << v.z << ")";
+    return text.str();
+}
+
+}  // namespace
+
+int ConverterTool::run(const std::vector<std::string>& arguments, std::ostream& out, std::ostream& err) {
+    ConverterOptions options;
+    std::string error;
+    if (!options.parse(arguments, error)) {
+        err << kTool << error << "\n" << "Try 'vi-modelconv --help'.\n";
+        return 2;
+    }
+    switch (options.action) {
+        case ConverterOptions::Help:
+            out << ConverterOptions::usage();
+            return 0;
+        case ConverterOptions::Info:
+            return info(options.input, out, err);
+        case ConverterOptions::Convert:
+            return convert(options, out, err);
+    }
+    return 2;
+}
+
+void ConverterTool::bounds(const MeshData& mesh, glm::vec3& boundsMin, glm::vec3& boundsMax) {
+    boundsMin = glm::vec3(std::numeric_limits<float>::max());
+    boundsMax = glm::vec3(-std::numeric_limits<float>::max());
+    for (const glm::vec3& p : mesh.positions) {
+        boundsMin = glm::min(boundsMin, p);
+        boundsMax = glm::max(boundsMax, p);
+    }
+    if (mesh.positions.empty()) boundsMin = boundsMax = glm::vec3(0.0f);
+}
+
+void ConverterTool::placeModel(const ConverterOptions& options, MeshData& mesh) {
+    glm::vec3 boundsMin, boundsMax;
+    bounds(mesh, boundsMin, boundsMax);
+    glm::vec3 offset = options.centre ? -0.5f * (boundsMin + boundsMax) : glm::vec3(0.0f);
+    float factor = options.scale;
+    if (options.fitSize > 0.0f) {
+        glm::vec3 extent = boundsMax - boundsMin;
+        float longest = glm::max(extent.x, glm::max(extent.y, extent.z));
+        if (longest > 0.0f) factor *= options.fitSize / longest;
+    }
+    // A negative factor mirrors the model; swap corners so faces stay outward.
+    for (glm::vec3& p : mesh.positions) p = (p + offset) * factor;
+    if (factor < 0.0f) {
+        for (glm::vec3& n : mesh.normals) n = -n;
+        for (std::size_t i = 0; i + 2 < mesh.indices.size(); i += 3) std::swap(mesh.indices[i + 1], mesh.indices[i + 2]);
+    }
+}
+
+int ConverterTool::convert(const ConverterOptions& options, std::ostream& out, std::ostream& err) {
+    MeshImporter::Options importOptions;
+    importOptions.flatNormals = options.flatNormals;
+    importOptions.creaseAngleDegrees = options.creaseAngle;
+    MeshData mesh;
+    std::vector<MeshImporter::MissingUv> missingUv;
+    std::string error;
+    if (!MeshImporter::import(options.input, importOptions, mesh, missingUv, error)) {
+        err << kTool << error << "\n";
+        return 1;
+    }
+    if (mesh.positions.size() > MeshData::kMaxVertices) {
+        err << kTool << "'" << options.input << "' needs " << mesh.positions.size()
+            << " vertices after joining its meshes, more than the " << MeshData::kMaxVertices
+            << " that 16-bit indices can address; nothing written\n";
+        return 1;
+    }
+    if (!missingUv.empty() && !options.generateUv) {
+        err << kTool << "'" << options.input << "' has no texture coordinates in " << missingUv[0].meshName;
+        if (missingUv.size() > 1) err << " and " << (missingUv.size() - 1) << " more mesh(es)";
+        err << "; pass --generate-uv to project them; nothing written\n";
+        return 1;
+    }
+    if (!missingUv.empty()) {
+        glm::vec3 boundsMin, boundsMax;
+        bounds(mesh, boundsMin, boundsMax);
+        UvProjection projection(options.uvMode, boundsMin, boundsMax);
+        for (const MeshImporter::MissingUv& run : missingUv) projection.apply(mesh, run.first, run.count);
+    }
+    if (options.flipV)
+        for (glm::vec2& t : mesh.texCoords) t.y = 1.0f - t.y;
+    placeModel(options, mesh);
+
+    std::vector<std::uint8_t> bytes = ModelFile::encode(mesh);
+    if (!ModelFile::writeAtomically(options.output, bytes, error)) {
+        err << kTool << error << "\n";
+        return 1;
+    }
+    if (!options.quiet) {
+        out << "wrote " << options.output << ": " << mesh.positions.size() << " vertices, " << mesh.indices.size()
+            << " indices (" << mesh.indices.size() / 3 << " triangles), " << bytes.size() << " bytes";
+        if (!missingUv.empty())
+            out << "; " << UvProjection::name(options.uvMode) << " texture coordinates for " << missingUv.size()
+                << " mesh(es)";
+        out << "\n";
+    }
+    return 0;
+}
+
+int ConverterTool::info(const std::string& path, std::ostream& out, std::ostream& err) {
+    std::vector<std::uint8_t> bytes;
+    std::string error;
+    if (!ModelFile::readWhole(path, bytes, error)) {
+        err << kTool << error << "\n";
+        return 1;
+    }
+    ModelFile::Info info;
+    if (!ModelFile::inspect(bytes, info, error)) {
+        err << kTool << "'" << path << "' is not a valid model file: " << error << "\n";
+        return 1;
+    }
+    out << "file: " << path << "\n"
+        << "vertices: " << info.vertexCount << "\n"
+        << "indices: " << info.indexCount << (info.indexCount == 0 ? " (drawn as a plain triangle list)" : "")
+        << "\n"
+        << "triangles: " << info.triangleCount() << "\n"
+        << "bounds: min " << formatVec3(info.boundsMin) << " max " << formatVec3(info.boundsMax) << "\n"
+        << "size: " << info.fileSize << " bytes, as V and I require\n";
+    return 0;
+}
+
+}  // namespace vi

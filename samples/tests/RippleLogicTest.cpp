@@ -1,0 +1,204 @@
+// The ripple sample's plain logic: its time line, ripples, animations, grades
+// and the wallpaper's cover fit. No GL.
+
+#include <cmath>
+
+#include <gtest/gtest.h>
+
+#include "FadeAnimation.h"
+#include "Render/Curves.h"
+#include "RippleField.h"
+#include "SceneClock.h"
+#include "SpinAnimation.h"
+#include "ToneGrades.h"
+#include "WaterRenderer.h"
+
+namespace {
+
+using vi::RippleField;
+
+TEST(SceneClock, ARestartOfTheRuntimeClockAddsOnlyTheTimeSinceIt) {
+    vi::SceneClock clock;
+    EXPECT_FLOAT_EQ(clock.observe(2.0f), 2.0f);
+    EXPECT_FLOAT_EQ(clock.observe(5.0f), 5.0f);
+    // The runtime restarted its clock 0.5 s ago.
+    EXPECT_FLOAT_EQ(clock.observe(0.5f), 5.5f);
+    EXPECT_FLOAT_EQ(clock.observe(1.25f), 6.25f);
+    EXPECT_FLOAT_EQ(clock.observe(1.25f), 6.25f);
+}
+
+TEST(RippleField, ATouchFillsAFreeSlotWithItsCentreAndAge) {
+    RippleField field;
+    field.setDropsEnabled(false);
+    field.add(glm::vec2(0.25f, 0.75f), 1.0f, 0.8f);
+    field.update(1.5f);
+    ASSERT_EQ(field.activeCount(), 1);
+    EXPECT_EQ(field.mRipples[0], glm::vec3(0.25f, 0.75f, 0.5f));
+    EXPECT_FLOAT_EQ(field.mAmplitudes[0], 0.8f);
+}
+
+TEST(RippleField, WhenFullTheWeakestRippleMakesRoom) {
+    RippleField field;
+    field.setDropsEnabled(false);
+    // Free slots fill in order; slot 5 holds a faint ripple.
+    for (int i = 0; i < RippleField::kSlots; ++i) field.add(glm::vec2(0.5f), 10.0f, i == 5 ? 0.05f : 1.0f);
+    field.add(glm::vec2(0.9f), 10.5f, 1.0f);
+    field.update(10.5f);
+    EXPECT_EQ(field.mRipples[5], glm::vec3(0.9f, 0.9f, 0.0f));
+    EXPECT_FLOAT_EQ(field.mAmplitudes[5], 1.0f);
+}
+
+TEST(RippleField, WhenFullAmongEqualRipplesTheOldestMakesRoom) {
+    RippleField field;
+    field.setDropsEnabled(false);
+    for (int i = 0; i < RippleField::kSlots; ++i) field.add(glm::vec2(0.5f), i == 7 ? 1.0f : 2.0f, 1.0f);
+    field.add(glm::vec2(0.1f), 3.0f, 1.0f);
+    EXPECT_EQ(glm::vec2(field.mRipples[7]), glm::vec2(0.1f));
+}
+
+TEST(RippleField, RipplesOlderThanTheirLifetimeFreeTheirSlots) {
+    RippleField field;
+    field.setDropsEnabled(false);
+    field.add(glm::vec2(0.5f), 0.0f, 1.0f);
+    field.update(RippleField::kLifetime - 0.01f);
+    EXPECT_EQ(field.activeCount(), 1);
+    field.update(RippleField::kLifetime + 0.01f);
+    EXPECT_EQ(field.activeCount(), 0);
+    EXPECT_EQ(field.mAmplitudes[0], 0.0f);
+}
+
+TEST(RippleField, CalmFadesEarlierRipplesButNotOnesMadeAfterItAtTheSameInstant) {
+    RippleField field;
+    field.setDropsEnabled(false);
+    field.add(glm::vec2(0.2f), 1.0f, 1.0f);
+    field.calm(2.0f);
+    field.add(glm::vec2(0.8f), 2.0f, 0.5f);  // an affordance's hint: calm, then a ripple
+    field.update(2.0f + 0.5f * RippleField::kCalmDuration);
+    EXPECT_NEAR(field.mAmplitudes[0], 0.5f, 1e-5f);
+    EXPECT_FLOAT_EQ(field.mAmplitudes[1], 0.5f);
+    field.update(2.0f + RippleField::kCalmDuration);
+    EXPECT_EQ(field.activeCount(), 1);
+    EXPECT_EQ(glm::vec2(field.mRipples[1]), glm::vec2(0.8f));
+}
+
+TEST(RippleField, DropsFallOnTheirScheduleAtTheirPositions) {
+    RippleField field;
+    field.update(RippleField::kDropFirst - 0.01f);
+    EXPECT_EQ(field.activeCount(), 0);
+    field.update(RippleField::kDropFirst + 0.1f);
+    ASSERT_EQ(field.activeCount(), 1);
+    EXPECT_EQ(glm::vec2(field.mRipples[0]), RippleField::dropPosition(0));
+    EXPECT_NEAR(field.mRipples[0].z, 0.1f, 1e-5f);
+    EXPECT_FLOAT_EQ(field.mAmplitudes[0], RippleField::kDropAmplitude);
+    field.update(RippleField::kDropFirst + RippleField::kDropInterval);
+    EXPECT_EQ(field.activeCount(), 2);
+}
+
+TEST(RippleField, NoDropFallsWhileTheWaterIsHeldCalm) {
+    RippleField field;
+    field.calm(0.0f);
+    for (float t = 0.0f; t < RippleField::kCalmHold; t += 0.1f) {
+        field.update(t);
+        ASSERT_EQ(field.activeCount(), 0) << "at " << t;
+    }
+    field.update(RippleField::kCalmHold + RippleField::kDropInterval);
+    EXPECT_EQ(field.activeCount(), 1);
+}
+
+TEST(RippleField, DropPositionsStayInsideTheScreen) {
+    for (unsigned int k = 0; k < 500; ++k) {
+        glm::vec2 p = RippleField::dropPosition(k);
+        EXPECT_TRUE(p.x >= 0.12f && p.x <= 0.88f && p.y >= 0.14f && p.y <= 0.86f) << k;
+    }
+}
+
+TEST(SpinAnimation, TurnsWithTimeAndNeverBackAfterARestart) {
+    vi::SpinAnimation spin(0.5f);
+    spin.update(1.0f);
+    EXPECT_FLOAT_EQ(spin.angle(), 0.5f);
+    spin.update(3.0f);
+    EXPECT_FLOAT_EQ(spin.angle(), 1.5f);
+    spin.update(0.2f);  // the runtime's clock was restarted 0.2 s ago
+    EXPECT_FLOAT_EQ(spin.angle(), 1.6f);
+}
+
+TEST(FadeAnimation, ReachesItsTargetAfterItsDurationAndStops) {
+    vi::FadeAnimation fade(1.0f, 0.5f);
+    fade.update(1.0f);
+    EXPECT_FLOAT_EQ(fade.value(), 1.0f);
+    fade.setTarget(0.0f);
+    fade.update(1.25f);
+    EXPECT_FLOAT_EQ(fade.value(), 0.5f);
+    fade.update(3.0f);
+    EXPECT_FLOAT_EQ(fade.value(), 0.0f);
+    fade.setTarget(1.0f);
+    fade.update(3.1f);
+    EXPECT_NEAR(fade.value(), 0.2f, 1e-5f);
+}
+
+TEST(ToneGrades, AnyIntSelectsAGrade) {
+    EXPECT_EQ(vi::ToneGrades::normalise(0), 0);
+    EXPECT_EQ(vi::ToneGrades::normalise(6), 1);
+    EXPECT_EQ(vi::ToneGrades::normalise(-1), vi::ToneGrades::kCount - 1);
+    EXPECT_STREQ(vi::ToneGrades::name(-4), "golden hour");
+}
+
+TEST(ToneGrades, StrengthIsAClampedPercentage) {
+    EXPECT_FLOAT_EQ(vi::ToneGrades::strength(-5), 0.0f);
+    EXPECT_FLOAT_EQ(vi::ToneGrades::strength(40), 0.4f);
+    EXPECT_FLOAT_EQ(vi::ToneGrades::strength(250), 1.0f);
+}
+
+TEST(ToneGrades, GoldenHourWarmsTheMidtones) {
+    vi::Curves* curves = vi::ToneGrades::create(1);
+    const unsigned char* mid = curves->mTable + 4 * 128;
+    EXPECT_EQ(mid[0], 152);
+    EXPECT_EQ(mid[1], 130);
+    EXPECT_EQ(mid[2], 100);
+    delete curves;
+}
+
+TEST(ToneGrades, WritingAGradeReplacesTheWholeTable) {
+    vi::Curves* target = vi::ToneGrades::create(2);
+    vi::Curves* reference = vi::ToneGrades::create(4);
+    vi::ToneGrades::write(4, *target);
+    for (int texel = 0; texel < 256; ++texel)
+        for (int channel = 0; channel < 3; ++channel)
+            ASSERT_EQ(target->mTable[4 * texel + channel], reference->mTable[4 * texel + channel]) << texel;
+    delete target;
+    delete reference;
+}
+
+glm::vec2 applyTransform(const glm::vec4& transform, glm::vec2 screen) {
+    return screen * glm::vec2(transform) + glm::vec2(transform.z, transform.w);
+}
+
+TEST(WaterRenderer, AWiderPictureIsCroppedAtItsSidesWithItsFirstRowOnTop) {
+    // 4:3 picture on a 9:16 screen: the middle 42 % of its width shows.
+    glm::vec4 transform = vi::WaterRenderer::coverTransform(glm::vec2(1024, 768), glm::vec2(540, 960));
+    glm::vec2 topLeft = applyTransform(transform, glm::vec2(0.0f, 1.0f));
+    glm::vec2 bottomRight = applyTransform(transform, glm::vec2(1.0f, 0.0f));
+    const float shown = (540.0f / 960.0f) / (1024.0f / 768.0f);
+    EXPECT_NEAR(topLeft.x, 0.5f - 0.5f * shown, 1e-6f);
+    EXPECT_NEAR(bottomRight.x, 0.5f + 0.5f * shown, 1e-6f);
+    EXPECT_NEAR(topLeft.y, 0.0f, 1e-6f);
+    EXPECT_NEAR(bottomRight.y, 1.0f, 1e-6f);
+}
+
+TEST(WaterRenderer, ATallerPictureIsCroppedAtTopAndBottom) {
+    glm::vec4 transform = vi::WaterRenderer::coverTransform(glm::vec2(360, 640), glm::vec2(960, 540));
+    glm::vec2 top = applyTransform(transform, glm::vec2(0.5f, 1.0f));
+    glm::vec2 bottom = applyTransform(transform, glm::vec2(0.5f, 0.0f));
+    const float shown = (360.0f / 640.0f) / (960.0f / 540.0f);
+    EXPECT_NEAR(top.y, 0.5f - 0.5f * shown, 1e-6f);
+    EXPECT_NEAR(bottom.y, 0.5f + 0.5f * shown, 1e-6f);
+    EXPECT_NEAR(top.x, 0.5f, 1e-6f);
+}
+
+TEST(WaterRenderer, APictureOfTheScreensShapeIsShownWhole) {
+    glm::vec4 transform = vi::WaterRenderer::coverTransform(glm::vec2(270, 480), glm::vec2(540, 960));
+    EXPECT_EQ(applyTransform(transform, glm::vec2(0.0f, 1.0f)), glm::vec2(0.0f, 0.0f));
+    EXPECT_EQ(applyTransform(transform, glm::vec2(1.0f, 0.0f)), glm::vec2(1.0f, 1.0f));
+}
+
+}  // namespace
