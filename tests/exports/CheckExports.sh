@@ -1,0 +1,31 @@
+#!/usr/bin/env bash
+# The runtime exports the host's JNI entry points, the vi classes plug-ins use
+# and the desktop asset functions, and nothing else.
+# usage: CheckExports.sh libtarqvevyncommon.so
+set -euo pipefail
+library="$1"
+symbols="$(nm -D --defined-only "$library" | awk '{print $3}')"
+[ -n "$symbols" ] || { echo "no exported symbols read from $library" >&2; exit 1; }
+
+stray="$(echo "$symbols" | c++filt | grep -v -E \
+  '^(vi::|typeinfo for vi::|typeinfo name for vi::|vtable for vi::|Java_com_tarq_android_visualeffect_common_Native_|AAssetManager_open$|AAsset_(getLength|read|close)$)' || true)"
+if [ -n "$stray" ]; then
+  echo "exported beyond the runtime's interface:" >&2
+  echo "$stray" >&2
+  exit 1
+fi
+
+methods="prehandleStart prehandleInitEffect prehandleRestart prehandleStop prehandlePause
+  prehandleRecycleTextures prehandleDraw prehandleTouch prehandleMenuPressed prehandleVolumeUpPressed
+  prehandleVolumeDownPressed prehandleParam prehandleClearEffect prehandleAffordance prehandleUnlock
+  prehandleSetOrientation loadModel loadTexture"
+missing=0
+for method in $methods; do
+  if ! echo "$symbols" | grep -qx "Java_com_tarq_android_visualeffect_common_Native_$method"; then
+    echo "JNI entry point not exported: $method" >&2
+    missing=1
+  fi
+done
+count="$(echo "$symbols" | grep -c '^Java_')"
+[ "$count" -eq 18 ] || { echo "expected 18 JNI entry points, found $count" >&2; missing=1; }
+exit $missing
