@@ -1,0 +1,32 @@
+package com.tarq.vi.player;
+
+/**
+ * What a phone gives its host and a desktop does not: a headless GL surface
+ * current on the calling thread, its pixels, the plug-in's asset directory,
+ * the window rectangle, why a plug-in does not load, and the preloaded clock.
+ * Every method must be called on the thread that opened the surface.
+ */
+final class Desktop {
+    private Desktop() {}
+
+    static native void open(int width, int height);
+
+    /** A new surface of the size, with the same GL context current. */
+    static native void resize(int width, int height);
+
+    /** Destroys the GL context and makes a new one current, as when the phone's host replaces it. */
+    static native void loseContext();
+
+    /** The surface's pixels as opaque ARGB, top row first; argb holds width x height ints. */
+    static native void readPixels(int[] argb);
+
+    static native void setAssetDirectory(String directory);
+
+    static native void setWindowRectangle(int left, int top, int width, int height);
+
+    /** Why the plug-in at path cannot be started (the loader's message or the missing factory), or null. */
+    static native String whyNotLoadable(String path);
+
+    /** Sets the runtime's realtime clock; false when the fixed clock is not preloaded. */
+    static native boolean setClock(long nanoseconds);
+}

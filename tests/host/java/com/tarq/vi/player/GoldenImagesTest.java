@@ -1,0 +1,91 @@
+package com.tarq.vi.player;
+
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import java.awt.image.BufferedImage;
+import java.io.IOException;
+import java.nio.file.Path;
+import javax.imageio.ImageIO;
+import org.junit.jupiter.params.ParameterizedTest;
+import org.junit.jupiter.params.provider.ValueSource;
+
+/**
+ * The sample effect rendered in fixed steps (RenderGoldens.sh, run before
+ * this test) against stored pictures. The tolerance absorbs a rasteriser
+ * update; the controls show that it still sees ripples gone, another grade
+ * or the gem missing.
+ */
+class GoldenImagesTest {
+    /** Per channel, 0 to 255. */
+    private static final int TOLERANCE = 8;
+    /** Share of pixels allowed beyond the tolerance (edges that move by a pixel). */
+    private static final double OUTLIERS = 0.002;
+
+    private static final Path GOLDEN = Path.of(System.getProperty("vi.golden"));
+    private static final Path RENDERS = Path.of(System.getProperty("vi.renders"));
+
+    /** Pixels beyond the tolerance, or -1 for pictures of different sizes. */
+    static int beyondTolerance(BufferedImage a, BufferedImage b) {
+        if (a.getWidth() != b.getWidth() || a.getHeight() != b.getHeight()) return -1;
+        int count = 0;
+        for (int y = 0; y < a.getHeight(); ++y) {
+            for (int x = 0; x < a.getWidth(); ++x) {
+                int p = a.getRGB(x, y);
+                int q = b.getRGB(x, y);
+                for (int shift = 0; shift < 24; shift += 8) {
+                    if (Math.abs(((p >> shift) & 0xFF) - ((q >> shift) & 0xFF)) > TOLERANCE) {
+                        ++count;
+                        break;
+                    }
+                }
+            }
+        }
+        return count;
+    }
+
+    static boolean matches(BufferedImage picture, BufferedImage golden) {
+        int beyond = beyondTolerance(picture, golden);
+        return beyond >= 0 && beyond <= OUTLIERS * golden.getWidth() * golden.getHeight();
+    }
+
+    private static BufferedImage read(Path file) throws IOException {
+        BufferedImage image = ImageIO.read(file.toFile());
+        assertTrue(image != null, "not a picture: " + file);
+        return image;
+    }
+
+    private static BufferedImage rendered(String run, String frame) throws IOException {
+        return read(RENDERS.resolve(run).resolve(frame));
+    }
+
+    @ParameterizedTest
+    @ValueSource(strings = {"frame-00003.png", "frame-00007.png", "frame-00011.png"})
+    void chosenFramesMatchTheirGoldens(String frame) throws IOException {
+        BufferedImage golden = read(GOLDEN.resolve(frame));
+        BufferedImage picture = rendered("run", frame);
+        assertTrue(matches(picture, golden), frame + ": " + beyondTolerance(picture, golden)
+            + " pixels differ by more than " + TOLERANCE);
+    }
+
+    @ParameterizedTest
+    @ValueSource(strings = {"no-touch", "other-grade", "no-gem"})
+    void aRealChangeDoesNotMatch(String control) throws IOException {
+        BufferedImage golden = read(GOLDEN.resolve("frame-00011.png"));
+        assertFalse(matches(rendered(control, "frame-00011.png"), golden), control + " passed for the golden");
+    }
+
+    @ParameterizedTest
+    @ValueSource(strings = {"frame-00000.png", "frame-00003.png", "frame-00005.png"})
+    void fixedStepRendersRepeatBitForBit(String frame) throws IOException {
+        // "other-grade" changes its grade at 0.6 s: until then it is the same
+        // render as "run", made by another process, and must be the same to the bit.
+        BufferedImage a = rendered("run", frame);
+        BufferedImage b = rendered("other-grade", frame);
+        assertEquals(a.getWidth(), b.getWidth());
+        assertArrayEquals(a.getRGB(0, 0, a.getWidth(), a.getHeight(), null, 0, a.getWidth()),
+            b.getRGB(0, 0, b.getWidth(), b.getHeight(), null, 0, b.getWidth()), frame);
+    }
+}
