@@ -9,7 +9,6 @@
 #include "Render/Curves.h"
 #include "RippleField.h"
 #include "SceneClock.h"
-#include "SpinAnimation.h"
 #include "ToneGrades.h"
 #include "WaterRenderer.h"
 
@@ -48,25 +47,6 @@ TEST(RippleField, WhenFullTheWeakestRippleMakesRoom) {
     EXPECT_FLOAT_EQ(field.mAmplitudes[5], 1.0f);
 }
 
-TEST(RippleField, WhenFullAmongEqualRipplesTheOldestMakesRoom) {
-    RippleField field;
-    field.setDropsEnabled(false);
-    for (int i = 0; i < RippleField::kSlots; ++i) field.add(glm::vec2(0.5f), i == 7 ? 1.0f : 2.0f, 1.0f);
-    field.add(glm::vec2(0.1f), 3.0f, 1.0f);
-    EXPECT_EQ(glm::vec2(field.mRipples[7]), glm::vec2(0.1f));
-}
-
-TEST(RippleField, RipplesOlderThanTheirLifetimeFreeTheirSlots) {
-    RippleField field;
-    field.setDropsEnabled(false);
-    field.add(glm::vec2(0.5f), 0.0f, 1.0f);
-    field.update(RippleField::kLifetime - 0.01f);
-    EXPECT_EQ(field.activeCount(), 1);
-    field.update(RippleField::kLifetime + 0.01f);
-    EXPECT_EQ(field.activeCount(), 0);
-    EXPECT_EQ(field.mAmplitudes[0], 0.0f);
-}
-
 TEST(RippleField, CalmFadesEarlierRipplesButNotOnesMadeAfterItAtTheSameInstant) {
     RippleField field;
     field.setDropsEnabled(false);
@@ -94,34 +74,6 @@ TEST(RippleField, DropsFallOnTheirScheduleAtTheirPositions) {
     EXPECT_EQ(field.activeCount(), 2);
 }
 
-TEST(RippleField, NoDropFallsWhileTheWaterIsHeldCalm) {
-    RippleField field;
-    field.calm(0.0f);
-    for (float t = 0.0f; t < RippleField::kCalmHold; t += 0.1f) {
-        field.update(t);
-        ASSERT_EQ(field.activeCount(), 0) << "at " << t;
-    }
-    field.update(RippleField::kCalmHold + RippleField::kDropInterval);
-    EXPECT_EQ(field.activeCount(), 1);
-}
-
-TEST(RippleField, DropPositionsStayInsideTheScreen) {
-    for (unsigned int k = 0; k < 500; ++k) {
-        glm::vec2 p = RippleField::dropPosition(k);
-        EXPECT_TRUE(p.x >= 0.12f && p.x <= 0.88f && p.y >= 0.14f && p.y <= 0.86f) << k;
-    }
-}
-
-TEST(SpinAnimation, TurnsWithTimeAndNeverBackAfterARestart) {
-    vi::SpinAnimation spin(0.5f);
-    spin.update(1.0f);
-    EXPECT_FLOAT_EQ(spin.angle(), 0.5f);
-    spin.update(3.0f);
-    EXPECT_FLOAT_EQ(spin.angle(), 1.5f);
-    spin.update(0.2f);  // the runtime's clock was restarted 0.2 s ago
-    EXPECT_FLOAT_EQ(spin.angle(), 1.6f);
-}
-
 TEST(FadeAnimation, ReachesItsTargetAfterItsDurationAndStops) {
     vi::FadeAnimation fade(1.0f, 0.5f);
     fade.update(1.0f);
@@ -134,19 +86,6 @@ TEST(FadeAnimation, ReachesItsTargetAfterItsDurationAndStops) {
     fade.setTarget(1.0f);
     fade.update(3.1f);
     EXPECT_NEAR(fade.value(), 0.2f, 1e-5f);
-}
-
-TEST(ToneGrades, AnyIntSelectsAGrade) {
-    EXPECT_EQ(vi::ToneGrades::normalise(0), 0);
-    EXPECT_EQ(vi::ToneGrades::normalise(6), 1);
-    EXPECT_EQ(vi::ToneGrades::normalise(-1), vi::ToneGrades::kCount - 1);
-    EXPECT_STREQ(vi::ToneGrades::name(-4), "golden hour");
-}
-
-TEST(ToneGrades, StrengthIsAClampedPercentage) {
-    EXPECT_FLOAT_EQ(vi::ToneGrades::strength(-5), 0.0f);
-    EXPECT_FLOAT_EQ(vi::ToneGrades::strength(40), 0.4f);
-    EXPECT_FLOAT_EQ(vi::ToneGrades::strength(250), 1.0f);
 }
 
 TEST(ToneGrades, GoldenHourWarmsTheMidtones) {
@@ -183,22 +122,6 @@ TEST(WaterRenderer, AWiderPictureIsCroppedAtItsSidesWithItsFirstRowOnTop) {
     EXPECT_NEAR(bottomRight.x, 0.5f + 0.5f * shown, 1e-6f);
     EXPECT_NEAR(topLeft.y, 0.0f, 1e-6f);
     EXPECT_NEAR(bottomRight.y, 1.0f, 1e-6f);
-}
-
-TEST(WaterRenderer, ATallerPictureIsCroppedAtTopAndBottom) {
-    glm::vec4 transform = vi::WaterRenderer::coverTransform(glm::vec2(360, 640), glm::vec2(960, 540));
-    glm::vec2 top = applyTransform(transform, glm::vec2(0.5f, 1.0f));
-    glm::vec2 bottom = applyTransform(transform, glm::vec2(0.5f, 0.0f));
-    const float shown = (360.0f / 640.0f) / (960.0f / 540.0f);
-    EXPECT_NEAR(top.y, 0.5f - 0.5f * shown, 1e-6f);
-    EXPECT_NEAR(bottom.y, 0.5f + 0.5f * shown, 1e-6f);
-    EXPECT_NEAR(top.x, 0.5f, 1e-6f);
-}
-
-TEST(WaterRenderer, APictureOfTheScreensShapeIsShownWhole) {
-    glm::vec4 transform = vi::WaterRenderer::coverTransform(glm::vec2(270, 480), glm::vec2(540, 960));
-    EXPECT_EQ(applyTransform(transform, glm::vec2(0.0f, 1.0f)), glm::vec2(0.0f, 0.0f));
-    EXPECT_EQ(applyTransform(transform, glm::vec2(1.0f, 0.0f)), glm::vec2(1.0f, 1.0f));
 }
 
 }  // namespace

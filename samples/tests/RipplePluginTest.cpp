@@ -139,17 +139,6 @@ int largestDifference(const std::vector<std::uint8_t>& a, const std::vector<std:
     return largest;
 }
 
-TEST(RipplePlugin, AsksTheHostForItsWallpaper) {
-    RunningScene scene(nullptr);
-    EXPECT_EQ(scene.mNames, std::vector<std::string>{"wallpaper"});
-}
-
-TEST(RipplePlugin, EveryFrameAsksForAnother) {
-    RunningScene scene(fileWallpaper(false));
-    EXPECT_EQ(scene.at(0.1), 1);
-    EXPECT_EQ(scene.at(2.0), 1);
-}
-
 TEST(RipplePlugin, ATouchDisturbsTheWaterAndAClearCalmsIt) {
     RunningScene scene(fileWallpaper(true));
     scene.at(0.1);

@@ -19,21 +19,6 @@ TEST(StagedPackage, HoldsTheRuntimeLibrary) {
     EXPECT_TRUE(exists(VI_STAGE_LIBDIR "/libtarqvevyncommon.so"));
 }
 
-TEST(StagedPackage, HoldsThePluginHeadersUnderTheirOwnIncludeRoot) {
-    for (const char* header : {"Application/Scene.h", "Application/Animation.h", "Application/AnimationManager.h",
-                               "Render/Texture.h", "Render/RenderableTexture.h", "Render/LightRenderer.h",
-                               "Render/Curves.h", "Tools/File.h", "Tools/Export.h", "Tools/DirectoryAssetManager.h"})
-        EXPECT_TRUE(exists(std::string("include/tarqvevyn/") + header)) << header;
-}
-
-TEST(StagedPackage, InstallsNoSourcesOrBuildFiles) {
-    for (const auto& entry : std::filesystem::recursive_directory_iterator(kStage + "/include")) {
-        if (entry.is_regular_file()) {
-            EXPECT_EQ(entry.path().extension(), ".h") << entry.path();
-        }
-    }
-}
-
 TEST(StagedPackage, HoldsAFindPackageConfigWithItsVersion) {
     const std::string dir = VI_STAGE_LIBDIR "/cmake/tarqvevyn/";
     EXPECT_TRUE(exists(dir + "tarqvevynConfig.cmake"));

@@ -33,18 +33,6 @@ TEST(Clock, RestartStartsFromTheReadingItKeepsAndCountsFromThere) {
     EXPECT_GE(AnimationManager::mNow, 0.0f);
 }
 
-TEST(Clock, StepAcrossASecondBoundaryStillCountsForward) {
-    timespec now;
-    clock_gettime(CLOCK_REALTIME, &now);
-    // The start's nanoseconds lie above any the next reading can have.
-    Timer::mStartingCnt = {now.tv_sec - 3, 999999999};
-    Timer::update();
-    ASSERT_LT(Timer::mCurrentCnt.tv_nsec, Timer::mStartingCnt.tv_nsec);
-    EXPECT_EQ(AnimationManager::mNow, expectedNow());
-    EXPECT_GT(AnimationManager::mNow, 2.0f);
-    EXPECT_LT(AnimationManager::mNow, 4.0f);
-}
-
 TEST(Clock, SecondsAndNanosecondsAreConvertedSeparatelyInSinglePrecision) {
     timespec now;
     clock_gettime(CLOCK_REALTIME, &now);

@@ -2,9 +2,7 @@
 // the host's one-shot events.
 #include <cstring>
 
-#include "GlContext.h"
 #include "RecordedScene.h"
-#include "Render/Renderer.h"
 
 using namespace apptest;
 using vi::Application;
@@ -67,13 +65,6 @@ TEST_F(Lifecycle, InitialisingTwiceInitialisesOnceButRestartsTheClockBothTimes) 
     EXPECT_FALSE(vi::gpScene->mInitialised[1]);
 }
 
-TEST_F(Lifecycle, InitialisationWithoutASceneDoesNothing) {
-    vi::Timer::mStartingCnt = kLongAgo;
-    Application::handleInitEffect();
-    EXPECT_TRUE(sameTime(vi::Timer::mStartingCnt, kLongAgo));
-    EXPECT_EQ(vi::gpScene, nullptr);
-}
-
 TEST_F(Lifecycle, SceneStartingInTheAlternateOrientationIsInitialisedForIt) {
     testSceneSetInitialOrientation(1);
     Application::handleStart(0, 0, 540, 960);
@@ -82,40 +73,6 @@ TEST_F(Lifecycle, SceneStartingInTheAlternateOrientationIsInitialisedForIt) {
     EXPECT_EQ(testSceneCount(TestSceneInitEffect), 0);
     EXPECT_TRUE(vi::gpScene->mInitialised[1]);
     EXPECT_TRUE(Application::isReady());
-}
-
-TEST_F(Lifecycle, SameOrientationOnlyAdvancesTheClock) {
-    startReadyScene();
-    vi::gpScene->mAspect = 5.0f;
-    vi::gpScene->mScale = glm::vec2(6.0f, 7.0f);
-    vi::AnimationManager::mNow = -1.0f;
-    Application::handleSetOrientation(vi::Orientation::Initial);
-    EXPECT_GE(vi::AnimationManager::mNow, 0.0f);
-    EXPECT_EQ(vi::gpScene->mAspect, 5.0f);
-    EXPECT_EQ(vi::gpScene->mScale, glm::vec2(6.0f, 7.0f));
-    EXPECT_EQ(testSceneEventCount(), 0);
-}
-
-TEST_F(Lifecycle, SwitchingOrientationDerivesAspectAndScaleFromTheSceneSize) {
-    struct Case {
-        int width, height;
-        float aspect;
-        glm::vec2 scale;
-    };
-    for (const Case& c : {Case{540, 960, 0.5625f, glm::vec2(1.0f, 1.7777778f)},
-                          Case{960, 540, 1.7777778f, glm::vec2(1.7777778f, 1.0f)}}) {
-        startReadyScene(c.width, c.height);
-        vi::gpScene->mAspect = 5.0f;
-        vi::gpScene->mScale = glm::vec2(6.0f, 7.0f);
-        // The window is never read for this.
-        Application::handleWindowRectangle(0, 0, 100, 100);
-        Application::handleSetOrientation(vi::Orientation::Alternate);
-        EXPECT_EQ(vi::gpScene->mOrientation, vi::Orientation::Alternate);
-        EXPECT_FLOAT_EQ(vi::gpScene->mAspect, c.aspect);
-        EXPECT_FLOAT_EQ(vi::gpScene->mScale.x, c.scale.x);
-        EXPECT_FLOAT_EQ(vi::gpScene->mScale.y, c.scale.y);
-        EXPECT_EQ(testSceneEventCount(), 0) << "no initialisation on a switch";
-    }
 }
 
 TEST_F(Lifecycle, SwitchToAnUninitialisedOrientationUnreadiesUntilInitialisedAndBackIsReadyAtOnce) {
@@ -130,39 +87,6 @@ TEST_F(Lifecycle, SwitchToAnUninitialisedOrientationUnreadiesUntilInitialisedAnd
     Application::handleDraw();
     EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneInitEffectAlternate, TestSceneDraw}));
     EXPECT_EQ(allEvents()[1].orientation, 0);
-}
-
-TEST_F(Lifecycle, OrientationNeedsASceneButNotAReadyOne) {
-    Application::handleSetOrientation(vi::Orientation::Alternate);
-    EXPECT_EQ(vi::gpScene, nullptr);
-    Application::handleStart(0, 0, 540, 960);
-    Application::handleSetOrientation(vi::Orientation::Alternate);
-    EXPECT_EQ(vi::gpScene->mOrientation, vi::Orientation::Alternate);
-}
-
-TEST_F(Lifecycle, RestartMakesAFreshSceneForTheCurrentWindowAndInitialisesIt) {
-    startReadyScene();
-    Application::handleWindowRectangle(3, 4, 300, 400);
-    Application::handleRestart();
-    EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneDestroyed, TestSceneCreated, TestSceneInitEffect}));
-    EXPECT_EQ(allEvents()[1].a, 300);
-    EXPECT_EQ(allEvents()[1].b, 400);
-    EXPECT_EQ(ApplicationVar::msWindowLeft, 3);
-    EXPECT_EQ(ApplicationVar::msWindowTop, 4);
-    EXPECT_TRUE(Application::isReady());
-}
-
-TEST_F(Lifecycle, StopAndDestroySceneDeleteTheSceneAndDropLaterEvents) {
-    for (void (*stop)() : {&Application::handleStop, &Application::destroyScene}) {
-        startReadyScene();
-        stop();
-        EXPECT_EQ(vi::gpScene, nullptr);
-        EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneDestroyed}));
-        EXPECT_EQ(Application::handleDraw(), 0);
-        Application::handleUnlock();
-        stop();
-        EXPECT_EQ(testSceneEventCount(), 1);
-    }
 }
 
 TEST_F(Lifecycle, OneShotEventsReachOnlyAReadySceneAfterTheClock) {
@@ -200,29 +124,3 @@ TEST_F(Lifecycle, ClearEffectRestartsTheClockAfterTheScene) {
     EXPECT_GE(vi::AnimationManager::mNow, 0.0f);
 }
 
-// Start and stop only notice a replaced context; a frame notices it only when
-// the scene is ready.
-TEST_F(Lifecycle, StartStopAndReadyFramesAdoptTheCurrentContext) {
-    vitest::GlContext gl(8, 8);
-    vi::Renderer::mEglContext = nullptr;
-    Application::handleStop();
-    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
-
-    vi::Renderer::mEglContext = nullptr;
-    Application::handleStart(0, 0, 540, 960);
-    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
-
-    vi::Renderer::mEglContext = nullptr;
-    Application::handleDraw();
-    EXPECT_EQ(vi::Renderer::mEglContext, nullptr);
-    Application::handleInitEffect();
-    Application::handleDraw();
-    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
-
-    vi::Renderer::mEglContext = nullptr;
-    Application::destroyScene();
-    EXPECT_EQ(vi::Renderer::mEglContext, gl.context());
-    vitest::GlContext::releaseCurrent();
-    Application::handleStop();
-    EXPECT_EQ(vi::Renderer::mEglContext, nullptr);
-}

@@ -81,36 +81,3 @@ TEST_F(SelfTest, EndingWithRandomWindowsLeavesTheLastRectangleOfAtLeastOnePixel)
     EXPECT_NE(plan.window.width, kWindow.width);
 }
 
-TEST_F(SelfTest, FirstCountOfZeroSkipsTheRestartsAndKeepsTheScene) {
-    const long seed = findSeed(kWindow, [](const Plan& p) { return p.phase1Passes == 0 && p.variant == 1 && !p.touches.empty(); });
-    runAndCompare(seed);
-    const std::vector<TestSceneEvent> downs = eventsOf(TestSceneTouchDown);
-    ASSERT_FALSE(downs.empty());
-    EXPECT_EQ(downs[0].scene, 1) << "the scene from before the key takes the gestures";
-    EXPECT_EQ(testSceneCount(TestSceneCreated), 0);
-}
-
-// Forty gestures allowed, but the first one's fifty moves use up the shared
-// counter: one gesture, fifty moves, and the phase ends.
-TEST_F(SelfTest, MovesUseUpTheGestureBudgetOfThePhase) {
-    long seed = 1;
-    for (;; ++seed) {
-        srand48(seed);
-        lrand48();  // the restarts' count: the restarts themselves draw nothing
-        if (lrand48() % 100 != 40) continue;
-        lrand48();  // the touch down's point
-        lrand48();
-        if (lrand48() % 100 != 50) continue;
-        if (replay(seed, kWindow).variant != 1) break;
-    }
-    runAndCompare(seed);
-    const std::vector<TestSceneEvent> events = allEvents();
-    std::vector<int> touches;
-    for (const TestSceneEvent& event : events)
-        if (event.kind == TestSceneTouchDown || event.kind == TestSceneTouchMove || event.kind == TestSceneTouchUp)
-            touches.push_back(event.kind);
-    std::vector<int> expected(52, TestSceneTouchMove);
-    expected.front() = TestSceneTouchDown;
-    expected.back() = TestSceneTouchUp;
-    EXPECT_EQ(touches, expected);
-}

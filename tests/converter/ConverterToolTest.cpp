@@ -154,32 +154,6 @@ TEST(ConverterTool, GenerateUvProjectsSphericallyAroundTheCentre) {
     }
 }
 
-TEST(ConverterTool, PlanarProjectionSpansTheTwoLongestAxes) {
-    ConverterScratch scratch;
-    // A 4 x 2 quad standing in the xz plane at y = 7.
-    scratch.write("quad.obj", "v 0 7 0\nv 4 7 0\nv 4 7 2\nv 0 7 2\nf 1 4 3 2\n");
-    vitest::ToolRun run =
-        runTool(scratch, {"--generate-uv=planar", scratch.pathOf("quad.obj"), scratch.pathOf("quad.bin")});
-    ASSERT_EQ(run.status, 0) << run.err;
-    DecodedModel model;
-    ASSERT_TRUE(vitest::decode(scratch.read("quad.bin"), model));
-    ASSERT_EQ(model.vertexCount, 4u);
-    for (std::size_t v = 0; v < 4; ++v) {
-        EXPECT_FLOAT_EQ(model.texCoords[v].x, model.positions[v].x / 4.0f);
-        EXPECT_FLOAT_EQ(model.texCoords[v].y, model.positions[v].z / 2.0f);
-    }
-}
-
-TEST(ConverterTool, UnknownProjectionIsABadCommandLine) {
-    ConverterScratch scratch;
-    scratch.write("bare.obj", vitest::cubeObj(false));
-    vitest::ToolRun run =
-        runTool(scratch, {"--generate-uv=cubic", scratch.pathOf("bare.obj"), scratch.pathOf("bare.bin")});
-    EXPECT_EQ(run.status, 2);
-    EXPECT_THAT(run.err, HasSubstr("cubic"));
-    EXPECT_FALSE(scratch.exists("bare.bin"));
-}
-
 TEST(ConverterTool, MoreThan65536VerticesAreRefusedAndAnOldOutputIsKept) {
     ConverterScratch scratch;
     scratch.write("grid.obj", vitest::gridObj(257));
@@ -191,13 +165,6 @@ TEST(ConverterTool, MoreThan65536VerticesAreRefusedAndAnOldOutputIsKept) {
     EXPECT_THAT(scratch.entries(), testing::UnorderedElementsAre("grid.obj", "grid.bin"));
     std::vector<std::uint8_t> kept = scratch.read("grid.bin");
     EXPECT_EQ(std::string(kept.begin(), kept.end()), "old");
-}
-
-TEST(ConverterTool, MoreThan65536VerticesLeaveNoOutputFile) {
-    ConverterScratch scratch;
-    scratch.write("grid.obj", vitest::gridObj(257));
-    EXPECT_EQ(runTool(scratch, {scratch.pathOf("grid.obj"), scratch.pathOf("grid.bin")}).status, 1);
-    EXPECT_THAT(scratch.entries(), testing::UnorderedElementsAre("grid.obj"));
 }
 
 TEST(ConverterTool, Exactly65536VerticesFitSixteenBitIndices) {
@@ -229,31 +196,6 @@ TEST(ConverterTool, NodeTransformsAreAppliedToEveryInstanceOfAMesh) {
     expectWindingAgreesWithNormals(model);
 }
 
-TEST(ConverterTool, CentreAndFitPlaceTheModelAroundTheOrigin) {
-    ConverterScratch scratch;
-    scratch.write("box.obj",
-                  "v 10 0 0\nv 14 0 0\nv 14 2 0\nv 10 2 0\nvt 0 0\nvt 1 0\nvt 1 1\nvt 0 1\nf 1/1 2/2 3/3 4/4\n");
-    vitest::ToolRun run = runTool(
-        scratch, {"--center", "--fit", "2", "--scale", "3", scratch.pathOf("box.obj"), scratch.pathOf("box.bin")});
-    ASSERT_EQ(run.status, 0) << run.err;
-    DecodedModel model;
-    ASSERT_TRUE(vitest::decode(scratch.read("box.bin"), model));
-    // Centred, longest side fitted to 2, then tripled.
-    for (glm::vec3 p : {glm::vec3(-3, -1.5f, 0), glm::vec3(3, -1.5f, 0), glm::vec3(3, 1.5f, 0), glm::vec3(-3, 1.5f, 0)})
-        EXPECT_TRUE(containsPosition(model, p)) << p.x << " " << p.y;
-}
-
-TEST(ConverterTool, FlipVTurnsTheTextureUpsideDown) {
-    ConverterScratch scratch;
-    scratch.write("triangle.obj", "v 0 0 0\nv 1 0 0\nv 0 1 0\nvt 0 0.25\nvt 1 0.25\nvt 0 1\nf 1/1 2/2 3/3\n");
-    ASSERT_EQ(runTool(scratch, {"--flip-v", scratch.pathOf("triangle.obj"), scratch.pathOf("t.bin")}).status, 0);
-    DecodedModel model;
-    ASSERT_TRUE(vitest::decode(scratch.read("t.bin"), model));
-    ASSERT_EQ(model.vertexCount, 3u);
-    EXPECT_FLOAT_EQ(model.texCoords[0].y, 0.75f);
-    EXPECT_FLOAT_EQ(model.texCoords[2].y, 0.0f);
-}
-
 TEST(ConverterTool, MissingNormalsAreComputedFacingOutward) {
     ConverterScratch scratch;
     scratch.write("tri.obj", "v 0 0 0\nv 1 0 0\nv 0 1 0\nvt 0 0\nvt 1 0\nvt 0 1\nf 1/1 2/2 3/3\n");
@@ -271,14 +213,6 @@ TEST(ConverterTool, UnreadableInputIsRefusedWithItsName) {
     EXPECT_FALSE(scratch.exists("out.bin"));
 }
 
-TEST(ConverterTool, OutputInAMissingDirectoryFailsCleanly) {
-    ConverterScratch scratch;
-    scratch.write("cube.obj", vitest::cubeObj(true));
-    vitest::ToolRun run = runTool(scratch, {scratch.pathOf("cube.obj"), scratch.pathOf("no/such/dir/cube.bin")});
-    EXPECT_EQ(run.status, 1);
-    EXPECT_THAT(run.err, HasSubstr("no/such/dir/cube.bin"));
-}
-
 TEST(ConverterTool, InfoPrintsCountsAndBounds) {
     ConverterScratch scratch;
     scratch.write("cube.obj", vitest::cubeObj(true));
@@ -290,52 +224,6 @@ TEST(ConverterTool, InfoPrintsCountsAndBounds) {
     EXPECT_THAT(run.out, HasSubstr("triangles: 12\n"));
     EXPECT_THAT(run.out, HasSubstr("bounds: min (-1, -1, -1) max (1, 1, 1)\n"));
     EXPECT_THAT(run.out, HasSubstr("size: 848 bytes"));
-}
-
-TEST(ConverterTool, InfoRejectsATruncatedFile) {
-    ConverterScratch scratch;
-    scratch.write("cube.obj", vitest::cubeObj(true));
-    ASSERT_EQ(runTool(scratch, {scratch.pathOf("cube.obj"), scratch.pathOf("cube.bin")}).status, 0);
-    std::vector<std::uint8_t> bytes = scratch.read("cube.bin");
-    bytes.resize(bytes.size() - 1);
-    scratch.writeBytes("short.bin", bytes);
-    vitest::ToolRun run = runTool(scratch, {"--info", scratch.pathOf("short.bin")});
-    EXPECT_EQ(run.status, 1);
-    EXPECT_THAT(run.err, HasSubstr("truncated: 847 bytes"));
-    EXPECT_THAT(run.err, HasSubstr("need 848"));
-    EXPECT_EQ(run.out, "");
-}
-
-TEST(ConverterTool, InfoRejectsAFileShorterThanItsHeader) {
-    ConverterScratch scratch;
-    scratch.writeBytes("tiny.bin", {3, 0, 0, 0, 3});
-    vitest::ToolRun run = runTool(scratch, {"--info", scratch.pathOf("tiny.bin")});
-    EXPECT_EQ(run.status, 1);
-    EXPECT_THAT(run.err, HasSubstr("too short for the 8-byte header"));
-}
-
-TEST(ConverterTool, InfoOfAMissingFileNamesIt) {
-    ConverterScratch scratch;
-    vitest::ToolRun run = runTool(scratch, {"--info", scratch.pathOf("nothing.bin")});
-    EXPECT_EQ(run.status, 1);
-    EXPECT_THAT(run.err, HasSubstr("nothing.bin"));
-}
-
-TEST(ConverterTool, HelpDocumentsTheProjections) {
-    ConverterScratch scratch;
-    vitest::ToolRun run = runTool(scratch, {"--help"});
-    EXPECT_EQ(run.status, 0);
-    EXPECT_THAT(run.out, HasSubstr("--generate-uv"));
-    EXPECT_THAT(run.out, HasSubstr("spherical"));
-    EXPECT_THAT(run.out, HasSubstr("planar"));
-}
-
-TEST(ConverterTool, WrongNumberOfFilesIsABadCommandLine) {
-    ConverterScratch scratch;
-    scratch.write("cube.obj", vitest::cubeObj(true));
-    vitest::ToolRun run = runTool(scratch, {scratch.pathOf("cube.obj")});
-    EXPECT_EQ(run.status, 2);
-    EXPECT_THAT(run.err, HasSubstr("output file"));
 }
 
 }  // namespace

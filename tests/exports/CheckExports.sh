@@ -26,6 +26,12 @@ for method in $methods; do
     missing=1
   fi
 done
+for asset_function in AAssetManager_open AAsset_getLength AAsset_read AAsset_close; do
+  if ! echo "$symbols" | grep -qx "$asset_function"; then
+    echo "asset function not exported: $asset_function" >&2
+    missing=1
+  fi
+done
 count="$(echo "$symbols" | grep -c '^Java_')"
 [ "$count" -eq 18 ] || { echo "expected 18 JNI entry points, found $count" >&2; missing=1; }
 exit $missing

@@ -12,7 +12,6 @@
 
 #include "FatalReportCapture.h"
 #include "Scratch.h"
-#include "Tools/DirectoryAssetManager.h"
 #include "Tools/File.h"
 
 using vitest::AssetDirectory;
@@ -61,28 +60,19 @@ TEST(FileDeathTest, MissingFileEndsTheProcessWithStatus45AndOnlyTheReport) {
         testing::ExitedWithCode(45), testing::StrEq(invalidFileReport(path, "File", 45)));
 }
 
-TEST(File, ReadsAssetsIncludingSubdirectoriesAndFilesByPath) {
+TEST(File, LoadOverALongerBufferLeavesExactlyTheAssetsLength) {
     AssetDirectory assets;
     const std::vector<char> bytes = {'\0', 'a', char(0xFF), '\n', 'z'};
     assets.write("data/bytes.bin", bytes);
-
-    vi::File asset("data/bytes.bin", true);
-    EXPECT_EQ(contentsOf(asset), bytes);
-
-    vi::File file(assets.pathOf("data/bytes.bin"), false);
-    EXPECT_EQ(contentsOf(file), bytes);
-}
-
-TEST(File, LoadOverALongerBufferLeavesExactlyTheAssetsLength) {
-    AssetDirectory assets;
-    assets.write("five.bin", "12345");
     vi::File file;
     std::vector<char> longer(100, 'x');
     file.write(longer.data(), unsigned(longer.size()));
 
-    file.load("five.bin");
+    file.load("data/bytes.bin");
+    EXPECT_EQ(contentsOf(file), bytes);
 
-    EXPECT_EQ(contentsOf(file), (std::vector<char>{'1', '2', '3', '4', '5'}));
+    vi::File byPath(assets.pathOf("data/bytes.bin"), false);
+    EXPECT_EQ(contentsOf(byPath), bytes);
 }
 
 TEST(File, EmptyFileAndEmptyAssetHaveLengthZero) {
@@ -119,21 +109,6 @@ TEST(File, TwoWritesThenFlushMakeOneFileInWriteOrderAndEmptyTheBuffer) {
     EXPECT_EQ(storage.read("a.raw"), std::vector<char>{'Z'});
 }
 
-TEST(File, FlushAppendsTheNameToTheStorageDirectoryAsGiven) {
-    AssetDirectory storage;
-    storage.write("sub/keep", "");
-    vi::File file;
-    file.write("xy", 2);
-    file.flush("sub/b.raw", false);
-    EXPECT_EQ(storage.read("sub/b.raw"), (std::vector<char>{'x', 'y'}));
-
-    // No separator is added: the directory string and the name are joined as they are.
-    vi::File::setExternalStorageDirectory(storage.pathOf("prefix-"));
-    file.write("q", 1);
-    file.flush("c.raw", false);
-    EXPECT_EQ(storage.read("prefix-c.raw"), std::vector<char>{'q'});
-}
-
 TEST(File, FlushToAPathThatCannotBeCreatedWritesNothingAndStillEmptiesTheBuffer) {
     AssetDirectory storage;
     vi::File file;
@@ -144,37 +119,4 @@ TEST(File, FlushToAPathThatCannotBeCreatedWritesNothingAndStillEmptiesTheBuffer)
     EXPECT_FALSE(storage.exists("no"));
     EXPECT_EQ(file.getLength(), 0u);
     EXPECT_GE(file.mData.capacity(), 3u);
-}
-
-TEST(File, WriteOfZeroBytesChangesNothing) {
-    vi::File file;
-    file.write("abc", 3);
-    const char* before = file.getBuffer();
-
-    file.write(nullptr, 0);
-    file.write("ignored", 0);
-
-    EXPECT_EQ(file.getBuffer(), before);
-    EXPECT_EQ(contentsOf(file), (std::vector<char>{'a', 'b', 'c'}));
-}
-
-TEST(DirectoryAssetManager, ReadsInPiecesAndReportsTheEndOfTheAsset) {
-    ScratchDirectory directory;
-    directory.write("seven.bin", "1234567");
-    AAssetManager* manager = vi::DirectoryAssetManager::create(directory.path());
-
-    EXPECT_EQ(AAssetManager_open(manager, "absent.bin", AASSET_MODE_UNKNOWN), nullptr);
-    // A directory opens with fopen on Linux, but it is no asset.
-    EXPECT_EQ(AAssetManager_open(manager, ".", AASSET_MODE_UNKNOWN), nullptr);
-    AAsset* asset = AAssetManager_open(manager, "seven.bin", AASSET_MODE_STREAMING);
-    ASSERT_NE(asset, nullptr);
-    EXPECT_EQ(AAsset_getLength(asset), 7);
-    char buffer[8] = {};
-    EXPECT_EQ(AAsset_read(asset, buffer, 4), 4);
-    EXPECT_EQ(AAsset_read(asset, buffer + 4, 4), 3);
-    EXPECT_EQ(AAsset_read(asset, buffer, 4), 0);
-    EXPECT_STREQ(buffer, "1234567");
-    AAsset_close(asset);
-
-    vi::DirectoryAssetManager::destroy(manager);
 }

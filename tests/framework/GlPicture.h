@@ -43,8 +43,13 @@ public:
 
 private:
     static std::vector<std::uint8_t> toBytes(const std::vector<Rgba>& texels) {
-        std::vector<std::uint8_t> bytes;
-        for (const Rgba& t : texels) bytes.insert(bytes.end(), {std::uint8_t(t.r), std::uint8_t(t.g), std::uint8_t(t.b), std::uint8_t(t.a)});
+        std::vector<std::uint8_t> bytes(texels.size() * 4);
+        for (std::size_t i = 0; i < texels.size(); ++i) {
+            bytes[4 * i] = std::uint8_t(texels[i].r);
+            bytes[4 * i + 1] = std::uint8_t(texels[i].g);
+            bytes[4 * i + 2] = std::uint8_t(texels[i].b);
+            bytes[4 * i + 3] = std::uint8_t(texels[i].a);
+        }
         return bytes;
     }
 

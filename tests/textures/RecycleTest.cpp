@@ -28,36 +28,23 @@ protected:
     GlContext mContext{16, 16};
 };
 
-TEST_F(RecycleTest, DynamicTexturesKeepTheirBuffers) {
-    void* owned = bigBuffer(1);
-    std::uint8_t lent[4] = {1, 2, 3, 4};
-    vi::Texture deletable(owned, 1024, 1024, false, false, false, false, false, 4, false);
-    deletable.setDeletable(true);
-    vi::Texture borrowed(lent, 1, 1, false, false, false, false, false, 4, false);
-    deletable.allocate();
-    borrowed.allocate();
-
-    HeapWatch watch;
-    vi::Application::handleRecycleTextures();
-    EXPECT_EQ(deletable.mBuffer, owned);
-    EXPECT_EQ(borrowed.mBuffer, static_cast<void*>(lent));
-    EXPECT_TRUE(watch.keptAll(kBigBuffer));
-    EXPECT_EQ(static_cast<unsigned char*>(owned)[kBigBuffer - 1], 1);
-}
-
-TEST_F(RecycleTest, StaticTexturesDropTheirBuffersAndFreeOnlyTheirOwn) {
+TEST_F(RecycleTest, StaticTexturesDropTheirBuffersAndFreeOnlyTheirOwnDynamicOnesKeepThem) {
     void* owned = bigBuffer(1);
     void* lent = bigBuffer(2);
     vi::Texture deletable(owned, 1024, 1024, true, false, false, false, false, 4, false);
     deletable.setDeletable(true);
     vi::Texture borrowed(lent, 1024, 1024, true, false, false, false, false, 4, false);
+    std::uint8_t live[4] = {1, 2, 3, 4};
+    vi::Texture dynamic(live, 1, 1, false, false, false, false, false, 4, false);
     deletable.allocate();
     borrowed.allocate();
+    dynamic.allocate();
 
     HeapWatch first;
     vi::Application::handleRecycleTextures();
     EXPECT_EQ(deletable.mBuffer, nullptr);
     EXPECT_EQ(borrowed.mBuffer, nullptr);
+    EXPECT_EQ(dynamic.mBuffer, static_cast<void*>(live));
     // Only the owned buffer went back to the heap; the lent one is intact.
     EXPECT_TRUE(first.gaveBack(kBigBuffer));
     EXPECT_TRUE(first.keptAll(2 * kBigBuffer));

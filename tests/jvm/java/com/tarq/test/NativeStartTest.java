@@ -82,14 +82,4 @@ class NativeStartTest extends HostTestBase {
         assertEquals(1.0f, created.sizeY);
         assertArrayEquals(new int[] {0, 0, 1, 1}, TestHost.windowRectangle());
     }
-
-    @Test
-    void loadModelAndRecyclingWithoutTexturesTouchNoScene() {
-        readyScene(540, 960);
-        host.loadModel("teapot");
-        host.loadModel(null);
-        host.prehandleRecycleTextures();
-        assertEquals(0, TestScene.eventCount());
-        assertTrue(TestHost.hasScene());
-    }
 }
