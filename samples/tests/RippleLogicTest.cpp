@@ -1,30 +1,18 @@
-// The ripple sample's plain logic: its time line, ripples, animations, grades
-// and the wallpaper's cover fit. No GL.
+// The ripple sample's plain logic: its ripples, grades and the wallpaper's
+// cover fit. No GL.
 
 #include <cmath>
 
 #include <gtest/gtest.h>
 
-#include "FadeAnimation.h"
 #include "Render/Curves.h"
 #include "RippleField.h"
-#include "SceneClock.h"
 #include "ToneGrades.h"
 #include "WaterRenderer.h"
 
 namespace {
 
 using vi::RippleField;
-
-TEST(SceneClock, ARestartOfTheRuntimeClockAddsOnlyTheTimeSinceIt) {
-    vi::SceneClock clock;
-    EXPECT_FLOAT_EQ(clock.observe(2.0f), 2.0f);
-    EXPECT_FLOAT_EQ(clock.observe(5.0f), 5.0f);
-    // The runtime restarted its clock 0.5 s ago.
-    EXPECT_FLOAT_EQ(clock.observe(0.5f), 5.5f);
-    EXPECT_FLOAT_EQ(clock.observe(1.25f), 6.25f);
-    EXPECT_FLOAT_EQ(clock.observe(1.25f), 6.25f);
-}
 
 TEST(RippleField, ATouchFillsAFreeSlotWithItsCentreAndAge) {
     RippleField field;
@@ -72,29 +60,6 @@ TEST(RippleField, DropsFallOnTheirScheduleAtTheirPositions) {
     EXPECT_FLOAT_EQ(field.mAmplitudes[0], RippleField::kDropAmplitude);
     field.update(RippleField::kDropFirst + RippleField::kDropInterval);
     EXPECT_EQ(field.activeCount(), 2);
-}
-
-TEST(FadeAnimation, ReachesItsTargetAfterItsDurationAndStops) {
-    vi::FadeAnimation fade(1.0f, 0.5f);
-    fade.update(1.0f);
-    EXPECT_FLOAT_EQ(fade.value(), 1.0f);
-    fade.setTarget(0.0f);
-    fade.update(1.25f);
-    EXPECT_FLOAT_EQ(fade.value(), 0.5f);
-    fade.update(3.0f);
-    EXPECT_FLOAT_EQ(fade.value(), 0.0f);
-    fade.setTarget(1.0f);
-    fade.update(3.1f);
-    EXPECT_NEAR(fade.value(), 0.2f, 1e-5f);
-}
-
-TEST(ToneGrades, GoldenHourWarmsTheMidtones) {
-    vi::Curves* curves = vi::ToneGrades::create(1);
-    const unsigned char* mid = curves->mTable + 4 * 128;
-    EXPECT_EQ(mid[0], 152);
-    EXPECT_EQ(mid[1], 130);
-    EXPECT_EQ(mid[2], 100);
-    delete curves;
 }
 
 TEST(ToneGrades, WritingAGradeReplacesTheWholeTable) {

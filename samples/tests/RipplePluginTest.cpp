@@ -151,29 +151,6 @@ TEST(RipplePlugin, ATouchDisturbsTheWaterAndAClearCalmsIt) {
     EXPECT_LE(largestDifference(touchRegion(), still), 2);
 }
 
-TEST(RipplePlugin, WithoutAHostWallpaperItShowsItsOwnBlueWater) {
-    RunningScene scene(nullptr);
-    scene.at(0.1);
-    Rgb corner = pixelAtNormalised(0.05f, 0.95f);
-    EXPECT_GT(corner.b, corner.r + 20);
-}
-
-TEST(RipplePlugin, TheHostsWallpaperIsGradedByParamStrength) {
-    RunningScene scene(fileWallpaper(false));
-    vi::Application::handleParam(1, 0);
-    scene.at(1.0);
-    Rgb plain = pixelAtNormalised(0.05f, 0.95f);
-    // Uniform grey in, grey out; this corner is darkened by 1 - 0.35 (0.45^2 + 0.45^2).
-    EXPECT_LE(std::abs(plain.r - plain.b), 2);
-    EXPECT_LE(std::abs(plain.r - plain.g), 2);
-    EXPECT_NEAR(plain.g, 51, 3);
-    vi::Application::handleParam(1, 100);
-    scene.at(2.0);
-    Rgb golden = pixelAtNormalised(0.05f, 0.95f);
-    EXPECT_GT(golden.r, plain.r + 8);
-    EXPECT_LT(golden.b, plain.b - 8);
-}
-
 TEST(RipplePlugin, TheGemFadesOnUnlockAndReturnsOnClear) {
     RunningScene scene(fileWallpaper(false));
     scene.at(0.2);
@@ -207,17 +184,6 @@ TEST(RipplePlugin, LandscapeMovesTheGemRightAndKeepsToTheHostsViewport) {
     EXPECT_EQ(above.g, 0);
     EXPECT_EQ(above.b, 255);
     glViewport(0, 0, kWidth, kHeight);
-}
-
-TEST(RipplePlugin, AffordanceShowsRingsNearTheBottom) {
-    RunningScene scene(fileWallpaper(false));
-    scene.at(0.2);
-    const int before = pixelAtNormalised(0.5f, 0.13f).luminance();
-    vi::Application::handleAffordance();
-    scene.at(0.5);
-    EXPECT_GT(pixelAtNormalised(0.5f, 0.13f).luminance(), before + 30);
-    scene.at(4.0);
-    EXPECT_LT(std::abs(pixelAtNormalised(0.5f, 0.13f).luminance() - before), 10);
 }
 
 }  // namespace

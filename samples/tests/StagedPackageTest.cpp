@@ -15,18 +15,11 @@ const std::string kStage = VI_STAGE_DIR;
 
 bool exists(const std::string& relative) { return std::filesystem::exists(kStage + "/" + relative); }
 
-TEST(StagedPackage, HoldsTheRuntimeLibrary) {
+TEST(StagedPackage, HoldsTheRuntimeLibraryItsFindPackageConfigAndTheModelConverter) {
     EXPECT_TRUE(exists(VI_STAGE_LIBDIR "/libtarqvevyncommon.so"));
-}
-
-TEST(StagedPackage, HoldsAFindPackageConfigWithItsVersion) {
     const std::string dir = VI_STAGE_LIBDIR "/cmake/tarqvevyn/";
-    EXPECT_TRUE(exists(dir + "tarqvevynConfig.cmake"));
-    EXPECT_TRUE(exists(dir + "tarqvevynConfigVersion.cmake"));
-    EXPECT_TRUE(exists(dir + "tarqvevynTargets.cmake"));
-}
-
-TEST(StagedPackage, HoldsTheModelConverterAsAnExecutable) {
+    for (const char* file : {"tarqvevynConfig.cmake", "tarqvevynConfigVersion.cmake", "tarqvevynTargets.cmake"})
+        EXPECT_TRUE(exists(dir + file)) << file;
     const std::string converter = kStage + "/bin/vi-modelconv";
     EXPECT_EQ(access(converter.c_str(), X_OK), 0) << converter;
 }

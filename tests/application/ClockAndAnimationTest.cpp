@@ -17,21 +17,7 @@ float expectedNow() {
     return float(nanoseconds) * 1e-9f + float(seconds);
 }
 
-bool notBefore(const timespec& a, const timespec& b) {
-    return a.tv_sec > b.tv_sec || (a.tv_sec == b.tv_sec && a.tv_nsec >= b.tv_nsec);
-}
-
 }  // namespace
-
-TEST(Clock, RestartStartsFromTheReadingItKeepsAndCountsFromThere) {
-    timespec before;
-    clock_gettime(CLOCK_REALTIME, &before);
-    Timer::restart();
-    EXPECT_TRUE(notBefore(Timer::mStartingCnt, before));
-    EXPECT_TRUE(notBefore(Timer::mCurrentCnt, Timer::mStartingCnt));
-    EXPECT_EQ(AnimationManager::mNow, expectedNow());
-    EXPECT_GE(AnimationManager::mNow, 0.0f);
-}
 
 TEST(Clock, SecondsAndNanosecondsAreConvertedSeparatelyInSinglePrecision) {
     timespec now;

@@ -6,7 +6,6 @@
 #include <thread>
 
 #include "RecordedScene.h"
-#include "SelfTestReplay.h"
 
 using namespace apptest;
 using vi::Application;

@@ -23,10 +23,7 @@ TEST_F(Lifecycle, StartClampsTheWindowAndGivesTheFactoryTheSizeAndBothMaps) {
     const char* names[] = {"sky", "glass"};
     testSceneSetNames(names, 2);
     std::vector<std::string>& returned = Application::handleStart(5, 7, 0, -3);
-    EXPECT_EQ(ApplicationVar::msWindowLeft, 5);
-    EXPECT_EQ(ApplicationVar::msWindowTop, 7);
-    EXPECT_EQ(ApplicationVar::msWindowWidth, 1);
-    EXPECT_EQ(ApplicationVar::msWindowHeight, 1);
+    EXPECT_EQ(windowRectangle(), (std::vector<int>{5, 7, 1, 1}));
     const std::vector<TestSceneEvent> created = eventsOf(TestSceneCreated);
     ASSERT_EQ(created.size(), 1u);
     EXPECT_EQ(created[0].a, 1);
@@ -63,16 +60,6 @@ TEST_F(Lifecycle, InitialisingTwiceInitialisesOnceButRestartsTheClockBothTimes) 
     EXPECT_EQ(testSceneCount(TestSceneInitEffectAlternate), 0);
     EXPECT_TRUE(vi::gpScene->mInitialised[0]);
     EXPECT_FALSE(vi::gpScene->mInitialised[1]);
-}
-
-TEST_F(Lifecycle, SceneStartingInTheAlternateOrientationIsInitialisedForIt) {
-    testSceneSetInitialOrientation(1);
-    Application::handleStart(0, 0, 540, 960);
-    Application::handleInitEffect();
-    EXPECT_EQ(testSceneCount(TestSceneInitEffectAlternate), 1);
-    EXPECT_EQ(testSceneCount(TestSceneInitEffect), 0);
-    EXPECT_TRUE(vi::gpScene->mInitialised[1]);
-    EXPECT_TRUE(Application::isReady());
 }
 
 TEST_F(Lifecycle, SwitchToAnUninitialisedOrientationUnreadiesUntilInitialisedAndBackIsReadyAtOnce) {

@@ -21,6 +21,11 @@ std::vector<int> kindsOf(const std::vector<TestSceneEvent>& events) {
     return kinds;
 }
 
+std::vector<int> windowRectangle() {
+    return {vi::ApplicationVar::msWindowLeft, vi::ApplicationVar::msWindowTop, vi::ApplicationVar::msWindowWidth,
+            vi::ApplicationVar::msWindowHeight};
+}
+
 void RecordedScene::SetUp() {
     vi::Application::handleStop();
     vi::AnimationManager::mStorage.clear();

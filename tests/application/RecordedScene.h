@@ -20,6 +20,8 @@ namespace apptest {
 std::vector<TestSceneEvent> allEvents();
 std::vector<TestSceneEvent> eventsOf(int kind);
 std::vector<int> kindsOf(const std::vector<TestSceneEvent>& events);
+// The window globals: left, top, width, height.
+std::vector<int> windowRectangle();
 
 class RecordedScene : public ::testing::Test {
 protected:

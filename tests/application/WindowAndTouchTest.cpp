@@ -7,13 +7,9 @@
 
 using namespace apptest;
 using vi::Application;
-using vi::ApplicationVar;
 
 TEST(DefaultWindow, IsFiveFortyByNineSixtyAtTheOriginAndNormalisesItsCentreToOneHalf) {
-    EXPECT_EQ(ApplicationVar::msWindowLeft, 0);
-    EXPECT_EQ(ApplicationVar::msWindowTop, 0);
-    EXPECT_EQ(ApplicationVar::msWindowWidth, 540);
-    EXPECT_EQ(ApplicationVar::msWindowHeight, 960);
+    EXPECT_EQ(windowRectangle(), (std::vector<int>{0, 0, 540, 960}));
     EXPECT_EQ(Application::mouseNormalize(270, 480), glm::vec2(0.5f, 0.5f));
     EXPECT_EQ(vi::gpScene, nullptr);
     EXPECT_EQ(vi::AnimationManager::mNow, 0.0f);
@@ -24,10 +20,7 @@ using WindowAndTouch = RecordedScene;
 TEST_F(WindowAndTouch, WindowRectangleIsClampedAndNotToldToTheScene) {
     startReadyScene();
     Application::handleWindowRectangle(-3, -4, 0, -20);
-    EXPECT_EQ(ApplicationVar::msWindowLeft, -3);
-    EXPECT_EQ(ApplicationVar::msWindowTop, -4);
-    EXPECT_EQ(ApplicationVar::msWindowWidth, 1);
-    EXPECT_EQ(ApplicationVar::msWindowHeight, 1);
+    EXPECT_EQ(windowRectangle(), (std::vector<int>{-3, -4, 1, 1}));
     EXPECT_EQ(testSceneEventCount(), 0);
     EXPECT_EQ(vi::gpScene->mSize, glm::vec2(540.0f, 960.0f));
 }

@@ -10,9 +10,6 @@
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -20,46 +17,9 @@
 #include <glm/glm.hpp>
 #include <gtest/gtest.h>
 
+#include "Scratch.h"
+
 namespace vitest {
-
-class ConverterScratch {
-public:
-    ConverterScratch() {
-        char pattern[] = "/tmp/vi-modelconv-XXXXXX";
-        mPath = mkdtemp(pattern);
-    }
-    ~ConverterScratch() { std::filesystem::remove_all(mPath); }
-
-    ConverterScratch(const ConverterScratch&) = delete;
-    ConverterScratch& operator=(const ConverterScratch&) = delete;
-
-    std::string pathOf(const std::string& name) const { return mPath + "/" + name; }
-
-    void write(const std::string& name, const std::string& text) const {
-        std::ofstream out(pathOf(name), std::ios::binary);
-        out << text;
-    }
-    void writeBytes(const std::string& name, const std::vector<std::uint8_t>& bytes) const {
-        std::ofstream out(pathOf(name), std::ios::binary);
-        out.write(reinterpret_cast<const char*>(bytes.data()), std::streamsize(bytes.size()));
-    }
-    std::vector<std::uint8_t> read(const std::string& name) const {
-        std::ifstream in(pathOf(name), std::ios::binary);
-        return std::vector<std::uint8_t>(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-    }
-    bool exists(const std::string& name) const { return std::filesystem::exists(pathOf(name)); }
-
-    // Every entry of the directory, so a test can see that nothing was left behind.
-    std::vector<std::string> entries() const {
-        std::vector<std::string> names;
-        for (const auto& entry : std::filesystem::directory_iterator(mPath))
-            names.push_back(entry.path().filename().string());
-        return names;
-    }
-
-private:
-    std::string mPath;
-};
 
 struct ToolRun {
     int status = -1;
@@ -73,24 +33,19 @@ inline std::string quote(const std::string& text) {
     return quoted + "'";
 }
 
-inline std::string slurp(const std::string& path) {
-    std::ifstream in(path);
-    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-}
-
 // Runs the real executable; the scratch directory takes its two streams.
-inline ToolRun runTool(const ConverterScratch& scratch, const std::vector<std::string>& arguments) {
+inline ToolRun runTool(const ScratchDirectory& scratch, const std::vector<std::string>& arguments) {
     std::string command = quote(VI_MODELCONV_PATH);
     for (const std::string& argument : arguments) command += " " + quote(argument);
-    const std::string outPath = scratch.pathOf(".stdout"), errPath = scratch.pathOf(".stderr");
-    command += " >" + quote(outPath) + " 2>" + quote(errPath);
+    command += " >" + quote(scratch.pathOf(".stdout")) + " 2>" + quote(scratch.pathOf(".stderr"));
     ToolRun run;
     int raw = std::system(command.c_str());
     run.status = WIFEXITED(raw) ? WEXITSTATUS(raw) : -1;
-    run.out = slurp(outPath);
-    run.err = slurp(errPath);
-    std::filesystem::remove(outPath);
-    std::filesystem::remove(errPath);
+    const std::vector<char> out = scratch.read(".stdout"), err = scratch.read(".stderr");
+    run.out.assign(out.begin(), out.end());
+    run.err.assign(err.begin(), err.end());
+    std::filesystem::remove(scratch.pathOf(".stdout"));
+    std::filesystem::remove(scratch.pathOf(".stderr"));
     return run;
 }
 

@@ -1,6 +1,5 @@
 // The full-screen background on a real context: orientation and stretch of
-// the picture read back, opacity ignored, the shared program's life, and a
-// render target behind it drawn again for every frame.
+// the picture read back, opacity ignored and the shared program's life.
 #include <gtest/gtest.h>
 
 #include <memory>
@@ -8,12 +7,10 @@
 #include <vector>
 
 #include "GlContext.h"
-#include "GlPicture.h"
+#include "Pictures.h"
 #include "GlRecorder.h"
-#include "Painters.h"
 #include "Render/Background.h"
 #include "Render/BackgroundRenderer.h"
-#include "Render/RenderableTexture.h"
 #include "Render/Renderer.h"
 
 using vitest::GlRecorder;

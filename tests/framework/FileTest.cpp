@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "FatalReportCapture.h"
-#include "Scratch.h"
+#include "AssetFiles.h"
 #include "Tools/File.h"
 
 using vitest::AssetDirectory;
@@ -75,21 +75,6 @@ TEST(File, LoadOverALongerBufferLeavesExactlyTheAssetsLength) {
     EXPECT_EQ(contentsOf(byPath), bytes);
 }
 
-TEST(File, EmptyFileAndEmptyAssetHaveLengthZero) {
-    AssetDirectory assets;
-    assets.write("empty.bin", "");
-    vi::File asset("empty.bin", true);
-    EXPECT_EQ(asset.getLength(), 0u);
-    vi::File file(assets.pathOf("empty.bin"), false);
-    EXPECT_EQ(file.getLength(), 0u);
-
-    // A load replaces earlier contents even when the asset is empty.
-    vi::File reused;
-    reused.write("abc", 3);
-    reused.load("empty.bin");
-    EXPECT_EQ(reused.getLength(), 0u);
-}
-
 TEST(File, TwoWritesThenFlushMakeOneFileInWriteOrderAndEmptyTheBuffer) {
     AssetDirectory storage;
     vi::File file;
@@ -119,4 +104,19 @@ TEST(File, FlushToAPathThatCannotBeCreatedWritesNothingAndStillEmptiesTheBuffer)
     EXPECT_FALSE(storage.exists("no"));
     EXPECT_EQ(file.getLength(), 0u);
     EXPECT_GE(file.mData.capacity(), 3u);
+}
+
+TEST(File, EmptyFileAndEmptyAssetHaveLengthZero) {
+    AssetDirectory assets;
+    assets.write("empty.bin", "");
+    vi::File asset("empty.bin", true);
+    EXPECT_EQ(asset.getLength(), 0u);
+    vi::File file(assets.pathOf("empty.bin"), false);
+    EXPECT_EQ(file.getLength(), 0u);
+
+    // A load replaces earlier contents even when the asset is empty.
+    vi::File reused;
+    reused.write("abc", 3);
+    reused.load("empty.bin");
+    EXPECT_EQ(reused.getLength(), 0u);
 }

@@ -1,6 +1,5 @@
 // The lit renderer on a real context: ambient, diffuse and specular light and
-// opacity read back from a textured face, a model file drawn through it, and
-// its bindings and shared program.
+// opacity read back from a textured face, and its bindings and shared program.
 #include <gtest/gtest.h>
 
 #include <memory>
@@ -10,11 +9,9 @@
 #include <glm/gtc/matrix_transform.hpp>
 
 #include "GlContext.h"
-#include "GlPicture.h"
+#include "Pictures.h"
 #include "GlRecorder.h"
 #include "Render/LightRenderer.h"
-#include "Render/ModelObject.h"
-#include "Scratch.h"
 
 using vitest::pixelAt;
 using vitest::PixelTexture;
@@ -23,7 +20,6 @@ using vitest::Rgba;
 namespace {
 
 const Rgba kTexel{200, 100, 50, 255};
-const Rgba kClearBlue{0, 0, 255, 255};
 
 // A face filling the viewport, facing +z, in one colour; the lighting
 // variables are the test's own and are read at every draw.
@@ -125,29 +121,6 @@ TEST_F(LitFace, SpecularLightIsAddedUncoloured) {
     EXPECT_TRUE(unlit.near(Rgba{100, 50, 25, 255}, 2)) << unlit;
 }
 
-TEST_F(LitFace, ModelFromAFileShowsWhereItsVerticesPlaceIt) {
-    vitest::AssetDirectory assets;
-    // The right half of the viewport, as two indexed triangles.
-    assets.write("half.bin",
-                 vitest::modelFile({{0, -1, 0}, {1, -1, 0}, {0, 1, 0}, {1, 1, 0}},
-                                   {{0, 0, 1}, {0, 0, 1}, {0, 0, 1}, {0, 0, 1}}, {{0, 0}, {1, 0}, {0, 1}, {1, 1}},
-                                   {0, 1, 2, 2, 1, 3}));
-    vi::ModelObject model("half");
-    vi::Drawable drawable;
-    drawable.texture = &texel.texture();
-    model.fillDrawable(drawable);
-    vi::LightRenderer renderer(drawable);
-    renderer.addUniform("uAmbient", &ambient, vi::Uniform::Float, 1);
-    renderer.addUniform("uShininess", &shininess, vi::Uniform::Float, 1);
-    ambient = 1.0f;
-
-    drawCentre(renderer);
-    EXPECT_TRUE(pixelAt(48, 32).near(kTexel, 2)) << pixelAt(48, 32);
-    EXPECT_TRUE(pixelAt(62, 62).near(kTexel, 2)) << pixelAt(62, 62);
-    EXPECT_EQ(pixelAt(16, 32), kClearBlue);
-
-}
-
 TEST_F(LitFace, RenderersShareOneProgramAndBindTheirArraysInOrder) {
     vitest::GlRecording recording;
     auto first = std::make_unique<vi::LightRenderer>(face);
@@ -173,4 +146,27 @@ TEST_F(LitFace, RenderersShareOneProgramAndBindTheirArraysInOrder) {
     second.reset();
     EXPECT_EQ(vi::LightRenderer::msShaderProgram, nullptr);
     EXPECT_FALSE(glIsProgram(shared));
+}
+
+TEST_F(LitFace, ModelFromAFileShowsWhereItsVerticesPlaceIt) {
+    vitest::AssetDirectory assets;
+    // The right half of the viewport, as two indexed triangles.
+    assets.write("half.bin",
+                 vitest::modelFile({{0, -1, 0}, {1, -1, 0}, {0, 1, 0}, {1, 1, 0}},
+                                   {{0, 0, 1}, {0, 0, 1}, {0, 0, 1}, {0, 0, 1}}, {{0, 0}, {1, 0}, {0, 1}, {1, 1}},
+                                   {0, 1, 2, 2, 1, 3}));
+    vi::ModelObject model("half");
+    vi::Drawable drawable;
+    drawable.texture = &texel.texture();
+    model.fillDrawable(drawable);
+    vi::LightRenderer renderer(drawable);
+    renderer.addUniform("uAmbient", &ambient, vi::Uniform::Float, 1);
+    renderer.addUniform("uShininess", &shininess, vi::Uniform::Float, 1);
+    ambient = 1.0f;
+
+    drawCentre(renderer);
+    EXPECT_TRUE(pixelAt(48, 32).near(kTexel, 2)) << pixelAt(48, 32);
+    EXPECT_TRUE(pixelAt(62, 62).near(kTexel, 2)) << pixelAt(62, 62);
+    EXPECT_EQ(pixelAt(16, 32), kClearBlue);
+
 }

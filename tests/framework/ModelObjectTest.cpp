@@ -1,5 +1,5 @@
 // Model files used in place: where a filled drawable points into the buffer,
-// which flags it gets, what it keeps, and scaling in place.
+// which flags it gets and what it keeps.
 #include <gtest/gtest.h>
 
 #include <GLES2/gl2.h>
@@ -10,7 +10,7 @@
 
 #include "Render/Drawable.h"
 #include "Render/ModelObject.h"
-#include "Scratch.h"
+#include "AssetFiles.h"
 
 using vitest::AssetDirectory;
 using vitest::modelFile;

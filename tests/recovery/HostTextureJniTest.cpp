@@ -1,7 +1,7 @@
 // The host's texture loading seen from a stand-in JNI environment: which JNI
 // functions it calls and in what order relative to the context check and the
 // GL upload, that the application lock is never held, and what the replace
-// path does in what order. Freed buffers are logged with the GL calls (the
+// path does in what order; unloading. Freed buffers are logged with the GL calls (the
 // test binary wraps free).
 #include <gtest/gtest.h>
 #include <jni.h>
@@ -167,6 +167,24 @@ TEST_F(HostLoading, ReplaceBeforeTheFirstAllocationStillShowsTheNewPixelsOnceAll
     EXPECT_TRUE(GlRecorder::callsNamed("glTexSubImage2D").empty());
 
     EXPECT_EQ(2, GlRecorder::callsNamed("glTexImage2D")[0].args[3]);
+}
+
+// Unloading a name never loaded files a null entry that a later load fills;
+// unloading a loaded one deletes the texture and leaves the stale pointer filed.
+TEST_F(HostLoading, UnloadFilesANullEntryOrKeepsTheStalePointer) {
+    jni.load("later", nullptr, 4, 4);
+    ASSERT_EQ(1u, vi::ApplicationVar::msTexturesMap.count("later"));
+    EXPECT_EQ(nullptr, vi::ApplicationVar::msTexturesMap["later"]);
+    std::vector<jint> pixels = {jint(0x7F123456u)};
+    jni.load("later", &pixels, 1, 1);
+    vi::Texture* texture = vi::ApplicationVar::msTexturesMap["later"];
+    ASSERT_NE(nullptr, texture);
+    EXPECT_EQ(1u, vi::Texture::mAllTextures.size());
+
+    jni.load("later", nullptr, 1, 1);
+    EXPECT_TRUE(vi::Texture::mAllTextures.empty()) << "the texture is deleted";
+    EXPECT_EQ(texture, vi::ApplicationVar::msTexturesMap["later"]) << "the entry keeps the old pointer";
+    vi::ApplicationVar::msTexturesMap.erase("later");
 }
 
 }  // namespace

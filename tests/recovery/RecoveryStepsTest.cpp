@@ -30,12 +30,6 @@ const char* const kTintVertex =
     "uniform vec2 uShift;\n"
     "varying vec3 vColour;\n"
     "void main() { vColour = aColour; gl_Position = vec4(aPosition + uShift, 0.0, 1.0); }\n";
-// The same program after an update that no longer reads aColour.
-const char* const kTintVertexWithoutColour =
-    "attribute vec2 aPosition;\n"
-    "uniform vec2 uShift;\n"
-    "varying vec3 vColour;\n"
-    "void main() { vColour = vec3(1.0); gl_Position = vec4(aPosition + uShift, 0.0, 1.0); }\n";
 const char* const kTintFragment =
     "precision mediump float;\n"
     "uniform float uTint;\n"
@@ -237,28 +231,6 @@ TEST_F(Registries, RecreationFollowsRegistryOrderRendererByRendererThenTextures)
     for (vi::Uniform* uniform : shared->uniforms)
         EXPECT_EQ(glGetUniformLocation(tintProgram->program, uniform->name.c_str()), uniform->location);
     EXPECT_EQ(kNoBuffer, plain->indexBuffer);
-}
-
-TEST_F(Registries, RecreationReadsTheRenderersAsTheyAreNow) {
-    makeScene();
-    // The drawable now has three vertices, and the program no longer reads aColour.
-    tinted->drawable->vertexCount = 3;
-    tintProgram->vertexSource = kTintVertexWithoutColour;
-    context->makeSecondCurrent();
-    GlRecording recording;
-    vi::ContextRecovery::recoverIfLost();
-
-    vi::Attribute& colour = *tinted->attributes[1];
-    EXPECT_EQ(-1, colour.location);
-    EXPECT_EQ(kNoBuffer, colour.buffer);
-    const std::vector<std::string> calls =
-        trace({"glGetAttribLocation", "glGenBuffers", "glBufferData", "glGetUniformLocation"});
-    const std::vector<std::string> tintedCalls(calls.begin(), calls.begin() + 8);
-    EXPECT_EQ((std::vector<std::string>{"glGenBuffers", "glBufferData", "glGetAttribLocation aPosition",
-                                        "glGenBuffers", "glBufferData", "glGetAttribLocation aColour",
-                                        "glGetUniformLocation uShift", "glGetUniformLocation uTint"}),
-              tintedCalls);
-    EXPECT_EQ(3 * 2 * 4, GlRecorder::callsNamed("glBufferData")[1].args[1]);
 }
 
 TEST_F(Registries, HostLoadingCheckComparesContextHandlesOnly) {

@@ -3,7 +3,6 @@
 
 #include <glm/gtc/matrix_transform.hpp>
 
-#include <string>
 #include <vector>
 
 #include "Render/GL.h"
@@ -17,21 +16,6 @@ void expectNear(const glm::vec3& actual, const glm::vec3& expected, float tolera
     EXPECT_NEAR(actual.y, expected.y, tolerance);
     EXPECT_NEAR(actual.z, expected.z, tolerance);
 }
-
-// Records which virtual slots the base class goes through.
-class SlotLog : public vi::Geometry {
-public:
-    void construct() override {
-        log += "construct ";
-        Geometry::construct();
-    }
-    void update() override { log += "update "; }
-    void clear() override {
-        log += "clear ";
-        Geometry::clear();
-    }
-    std::string log;
-};
 
 }  // namespace
 
@@ -50,37 +34,6 @@ TEST(Geometry, RotationMatchesGlmAboutAnyAxisAndLeavesNormals) {
         EXPECT_EQ(geometry.normals[3], glm::vec3(0.6f, 0.8f, 0));
         EXPECT_EQ(geometry.normals[0], glm::vec3(0, 0, 1));
     }
-}
-
-TEST(Geometry, TranslateAndScaleMovePositionsOnly) {
-    vi::Geometry geometry;
-    geometry.positions = {{1, 2, 3}, {-1, 0, 4}};
-    geometry.normals = {{0, 0, 1}, {0, 1, 0}};
-    geometry.translate({10, -1, 0.5f});
-    geometry.scale({2, 3, -1});
-    EXPECT_EQ(geometry.positions[0], glm::vec3(22, 3, -3.5f));
-    EXPECT_EQ(geometry.positions[1], glm::vec3(18, -3, -4.5f));
-    EXPECT_EQ(geometry.normals[1], glm::vec3(0, 1, 0));
-}
-
-TEST(Geometry, EmptyGeometryStaysEmptyAndInStripMode) {
-    vi::Geometry geometry{vi::Geometry::DoNotConstruct()};
-    EXPECT_EQ(geometry.mode, unsigned(GL_TRIANGLE_STRIP));
-    geometry.normals = {{0, 0, 1}};
-    geometry.translate({1, 1, 1});
-    geometry.rotate(1.0f, {0, 0, 0});  // a zero axis is harmless with no positions
-    geometry.scale({0, 0, 0});
-    EXPECT_TRUE(geometry.positions.empty());
-    EXPECT_EQ(geometry.normals, (std::vector<glm::vec3>{{0, 0, 1}}));
-}
-
-TEST(Geometry, ReconstructClearsThenConstructsThroughTheVirtualSlots) {
-    SlotLog geometry;
-    EXPECT_EQ(geometry.log, "");  // the constructor does not construct
-    geometry.positions = {{1, 1, 1}};
-    geometry.reconstruct();
-    EXPECT_EQ(geometry.log, "clear construct update ");
-    EXPECT_TRUE(geometry.positions.empty());
 }
 
 TEST(GeometryRectangle, BuildsAStripQuadInPlaneZeroWithTopRowOnTheUpperEdge) {
@@ -104,6 +57,26 @@ TEST(GeometryRectangle, UpdateMovesCornersAndResetsNormalsOnly) {
     EXPECT_EQ(rectangle.normals[2], glm::vec3(0, 0, 1));
     EXPECT_EQ(rectangle.texCoords[0], glm::vec2(0.5f, 0.5f));
     EXPECT_EQ(rectangle.getBorder(), glm::vec4(-1, 1, -2, -1.5f));
+}
+
+TEST(Geometry, EmptyGeometryStaysEmptyAndInStripMode) {
+    vi::Geometry geometry{vi::Geometry::DoNotConstruct()};
+    EXPECT_EQ(geometry.mode, unsigned(GL_TRIANGLE_STRIP));
+    geometry.normals = {{0, 0, 1}};
+    geometry.translate({1, 1, 1});
+    geometry.rotate(1.0f, {0, 0, 0});  // a zero axis is harmless with no positions
+    geometry.scale({0, 0, 0});
+    EXPECT_TRUE(geometry.positions.empty());
+    EXPECT_EQ(geometry.normals, (std::vector<glm::vec3>{{0, 0, 1}}));
+}
+
+TEST(Geometry, ReconstructClearsThenConstructsThroughTheVirtualSlots) {
+    SlotLog geometry;
+    EXPECT_EQ(geometry.log, "");  // the constructor does not construct
+    geometry.positions = {{1, 1, 1}};
+    geometry.reconstruct();
+    EXPECT_EQ(geometry.log, "clear construct update ");
+    EXPECT_TRUE(geometry.positions.empty());
 }
 
 TEST(GeometryRectangle, ConstructLeavesExactlyFourEntriesAndRebuildsIdentically) {

@@ -1,5 +1,5 @@
 // Renderers on a real context: what they bind by name, what they upload at
-// each draw, the matrices they derive, the registry and the state switches.
+// each draw, the matrices they derive and the registry.
 #include <gtest/gtest.h>
 
 #include <glm/gtc/matrix_transform.hpp>
@@ -11,6 +11,7 @@
 
 #include "GlContext.h"
 #include "GlRecorder.h"
+#include "Pictures.h"
 #include "Render/Drawable.h"
 #include "Render/Renderer.h"
 #include "Render/ShaderProgram.h"
@@ -19,6 +20,7 @@ using vitest::GlCall;
 using vitest::GlContext;
 using vitest::GlRecorder;
 using vitest::GlRecording;
+using vitest::uniformFloats;
 
 namespace {
 
@@ -79,13 +81,6 @@ const std::vector<std::string> kUploads = {
     "glUniformMatrix2fv", "glUniformMatrix3fv", "glUniformMatrix4fv", "glUniform1iv", "glUniform2iv", "glUniform3iv",
     "glUniform4iv",       "glUniform1fv",       "glUniform2fv",       "glUniform3fv", "glUniform4fv"};
 
-std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
-    std::vector<float> values(16, -99.0f);
-    glGetUniformfv(program, glGetUniformLocation(program, name), values.data());
-    values.resize(n);
-    return values;
-}
-
 std::vector<int> uniformInts(GLuint program, const char* name, int n) {
     std::vector<int> values(4, -99);
     glGetUniformiv(program, glGetUniformLocation(program, name), values.data());
@@ -95,19 +90,14 @@ std::vector<int> uniformInts(GLuint program, const char* name, int n) {
 
 std::vector<float> floatsOf(const float* values, int n) { return std::vector<float>(values, values + n); }
 
-std::vector<float> floatsOf(const glm::mat4& m) { return floatsOf(&m[0][0], 16); }
+template <int N>
+std::vector<float> floatsOf(const glm::mat<N, N, float>& m) { return floatsOf(&m[0][0], N * N); }
 
-std::vector<float> floatsOf(const glm::mat3& m) { return floatsOf(&m[0][0], 9); }
-
-void expectMatrixNear(const glm::mat4& actual, const glm::mat4& expected, float tolerance = 1e-5f) {
-    for (int c = 0; c < 4; ++c)
-        for (int r = 0; r < 4; ++r)
-            EXPECT_NEAR(actual[c][r], expected[c][r], tolerance) << "column " << c << " row " << r;
-}
-
-void expectMatrixNear(const glm::mat3& actual, const glm::mat3& expected, float tolerance = 1e-5f) {
-    for (int c = 0; c < 3; ++c)
-        for (int r = 0; r < 3; ++r)
+template <int N>
+void expectMatrixNear(const glm::mat<N, N, float>& actual, const glm::mat<N, N, float>& expected,
+                      float tolerance = 1e-5f) {
+    for (int c = 0; c < N; ++c)
+        for (int r = 0; r < N; ++r)
             EXPECT_NEAR(actual[c][r], expected[c][r], tolerance) << "column " << c << " row " << r;
 }
 

@@ -8,6 +8,7 @@
 
 #include "GlContext.h"
 #include "GlRecorder.h"
+#include "Pictures.h"
 #include "Render/Drawable.h"
 #include "Render/GeometryRectangle.h"
 #include "Render/Renderer.h"
@@ -18,6 +19,7 @@ using vitest::GlCall;
 using vitest::GlContext;
 using vitest::GlRecorder;
 using vitest::GlRecording;
+using vitest::uniformFloats;
 
 namespace {
 
@@ -61,20 +63,7 @@ std::vector<std::uint8_t> texelPattern() {
 }
 
 std::uint32_t texel(const std::vector<std::uint8_t>& pixels, int x, int y) {
-    const std::uint8_t* p = &pixels[4 * (y * kTexels + x)];
-    return std::uint32_t(p[0]) << 24 | std::uint32_t(p[1]) << 16 | std::uint32_t(p[2]) << 8 | p[3];
-}
-
-std::uint32_t pixelAt(const std::vector<std::uint8_t>& frame, int width, int x, int y) {
-    const std::uint8_t* p = &frame[4 * (y * width + x)];
-    return std::uint32_t(p[0]) << 24 | std::uint32_t(p[1]) << 16 | std::uint32_t(p[2]) << 8 | p[3];
-}
-
-std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
-    std::vector<float> values(4, -99.0f);
-    glGetUniformfv(program, glGetUniformLocation(program, name), values.data());
-    values.resize(n);
-    return values;
+    return vitest::rgba(&pixels[std::size_t(4 * (y * kTexels + x))]);
 }
 
 // A quad over the whole viewport, drawn from a rectangle's arrays.
@@ -153,11 +142,10 @@ TEST_F(RendererTextureTest, TexturedQuadReadsBackAsTheTextureWithItsTopRowUp) {
     glClear(GL_COLOR_BUFFER_BIT);
     renderer.render();
     const int size = mGl.width();
-    std::vector<std::uint8_t> frame = vitest::readPixels(0, 0, size, size);
+    const std::vector<std::uint32_t> frame = vitest::readWords(0, 0, size, size);
     const int scale = size / kTexels;
     for (int y = 0; y < size; ++y)
         for (int x = 0; x < size; ++x)
-            ASSERT_EQ(pixelAt(frame, size, x, y), texel(pixels, x / scale, kTexels - 1 - y / scale))
+            ASSERT_EQ(frame[std::size_t(y * size + x)], texel(pixels, x / scale, kTexels - 1 - y / scale))
                 << "pixel " << x << ", " << y;
-
 }

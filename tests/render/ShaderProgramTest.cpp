@@ -1,5 +1,5 @@
-// Programs on a real context: the build sequence, rebuilding after a lost
-// context, and the two fatal exits.
+// Programs on a real context: the build sequence, destruction, and the two
+// fatal exits.
 #include <gtest/gtest.h>
 #include <gmock/gmock.h>
 
@@ -82,13 +82,9 @@ void buildProgramAndWatchTheExit(const char* vertex, const char* fragment) {
 
 // The detail is the driver's info log between quotes, then the location block.
 std::string reportPattern(const std::string& infoLog, const std::string& function, int line) {
-    return "^\"" + infoLog + "\"\n"
-           "In file : \"/[^\"]*/Render/ShaderProgram\\.cpp\"\n"
-           "In function : \"" +
-           function +
-           "\"\n"
-           "In line : " +
-           std::to_string(line) + "\ncalls: ";
+    const std::string file = "In file : \"/[^\"]*/Render/ShaderProgram\\.cpp\"\n";
+    return "^\"" + infoLog + "\"\n" + file + "In function : \"" + function + "\"\n" +
+           "In line : " + std::to_string(line) + "\ncalls: ";
 }
 
 class ShaderProgramDeath : public ::testing::Test {
@@ -126,31 +122,6 @@ TEST(ShaderProgram, BuildsBothShadersThenLinksAndKeepsNoShaderObjects) {
     EXPECT_EQ(c[14].args[0], vertexShader);
 }
 
-TEST(ShaderProgram, InitInTheSameContextBuildsNothing) {
-    GlContext gl(8, 8);
-    vi::ShaderProgram program(kVertex, kFragment);
-    const GLuint name = program.program;
-    GlRecording recording;
-    program.init();
-    program.init();
-    EXPECT_EQ(GlRecorder::names(), (std::vector<std::string>{"glIsProgram", "glIsProgram"}));
-    EXPECT_EQ(program.program, name);
-}
-
-TEST(ShaderProgram, InitAfterTheContextWasReplacedBuildsAndStoresANewProgram) {
-    GlContext gl(8, 8);
-    vi::ShaderProgram program(kVertex, kFragment);
-    gl.recreate();
-    ASSERT_FALSE(glIsProgram(program.program));
-
-    GlRecording recording;
-    program.init();
-    GlRecorder::stop();
-    ASSERT_EQ(GlRecorder::count("glCreateProgram"), 1);
-    EXPECT_EQ(program.program, GlRecorder::callsNamed("glCreateProgram")[0].args[0]);
-    EXPECT_EQ(programParameter(program.program, GL_LINK_STATUS), GL_TRUE);
-}
-
 TEST(ShaderProgram, DestructionUnbindsTheCurrentProgramBeforeDeletingIt) {
     GlContext gl(8, 8);
     auto* program = new vi::ShaderProgram(kVertex, kFragment);
@@ -183,4 +154,29 @@ TEST_F(ShaderProgramDeath, ShadersThatCompileButDoNotLinkExit67) {
                                         "glDeleteShader\\(fragment\\) glGetProgramiv glGetProgramInfoLog "
                                         "glDeleteProgram\n"
                                         "stdout bytes: 0\n$"));
+}
+
+TEST(ShaderProgram, InitInTheSameContextBuildsNothing) {
+    GlContext gl(8, 8);
+    vi::ShaderProgram program(kVertex, kFragment);
+    const GLuint name = program.program;
+    GlRecording recording;
+    program.init();
+    program.init();
+    EXPECT_EQ(GlRecorder::names(), (std::vector<std::string>{"glIsProgram", "glIsProgram"}));
+    EXPECT_EQ(program.program, name);
+}
+
+TEST(ShaderProgram, InitAfterTheContextWasReplacedBuildsAndStoresANewProgram) {
+    GlContext gl(8, 8);
+    vi::ShaderProgram program(kVertex, kFragment);
+    gl.recreate();
+    ASSERT_FALSE(glIsProgram(program.program));
+
+    GlRecording recording;
+    program.init();
+    GlRecorder::stop();
+    ASSERT_EQ(GlRecorder::count("glCreateProgram"), 1);
+    EXPECT_EQ(program.program, GlRecorder::callsNamed("glCreateProgram")[0].args[0]);
+    EXPECT_EQ(programParameter(program.program, GL_LINK_STATUS), GL_TRUE);
 }

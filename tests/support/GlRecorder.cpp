@@ -190,51 +190,27 @@ FORWARD_GEN(glGenFramebuffers)
 FORWARD_GEN(glGenRenderbuffers)
 FORWARD_GEN(glGenTextures)
 
-#define FORWARD_DELETE(name)                                          \
-    extern "C" void __real_##name(GLsizei n, const GLuint* names);    \
-    extern "C" void __wrap_##name(GLsizei n, const GLuint* names) {   \
-        GlRecorder::record(#name, {double(n), double(names[0])});     \
-        __real_##name(n, names);                                      \
+FORWARD0(void, glDeleteBuffers, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
+FORWARD0(void, glDeleteFramebuffers, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
+FORWARD0(void, glDeleteRenderbuffers, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
+FORWARD0(void, glDeleteTextures, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
+
+// Calls with a result: the result is recorded after the arguments.
+#define FORWARD_RESULT(ret, name, params, args, text, ...)  \
+    extern "C" ret __real_##name params;                    \
+    extern "C" ret __wrap_##name params {                   \
+        ret result = __real_##name args;                    \
+        GlRecorder::record(#name, {__VA_ARGS__}, text);     \
+        return result;                                      \
     }
-FORWARD_DELETE(glDeleteBuffers)
-FORWARD_DELETE(glDeleteFramebuffers)
-FORWARD_DELETE(glDeleteRenderbuffers)
-FORWARD_DELETE(glDeleteTextures)
-
-extern "C" GLenum __real_glCheckFramebufferStatus(GLenum t);
-extern "C" GLenum __wrap_glCheckFramebufferStatus(GLenum t) {
-    GLenum result = __real_glCheckFramebufferStatus(t);
-    GlRecorder::record("glCheckFramebufferStatus", {double(t), double(result)});
-    return result;
-}
-
-extern "C" GLuint __real_glCreateProgram();
-extern "C" GLuint __wrap_glCreateProgram() {
-    GLuint result = __real_glCreateProgram();
-    GlRecorder::record("glCreateProgram", {double(result)});
-    return result;
-}
-
-extern "C" GLuint __real_glCreateShader(GLenum t);
-extern "C" GLuint __wrap_glCreateShader(GLenum t) {
-    GLuint result = __real_glCreateShader(t);
-    GlRecorder::record("glCreateShader", {double(t), double(result)});
-    return result;
-}
-
-extern "C" GLint __real_glGetAttribLocation(GLuint p, const GLchar* n);
-extern "C" GLint __wrap_glGetAttribLocation(GLuint p, const GLchar* n) {
-    GLint result = __real_glGetAttribLocation(p, n);
-    GlRecorder::record("glGetAttribLocation", {double(p), double(result)}, n);
-    return result;
-}
-
-extern "C" GLint __real_glGetUniformLocation(GLuint p, const GLchar* n);
-extern "C" GLint __wrap_glGetUniformLocation(GLuint p, const GLchar* n) {
-    GLint result = __real_glGetUniformLocation(p, n);
-    GlRecorder::record("glGetUniformLocation", {double(p), double(result)}, n);
-    return result;
-}
+FORWARD_RESULT(GLenum, glCheckFramebufferStatus, (GLenum t), (t), nullptr, double(t), double(result))
+FORWARD_RESULT(GLuint, glCreateProgram, (), (), nullptr, double(result))
+FORWARD_RESULT(GLuint, glCreateShader, (GLenum t), (t), nullptr, double(t), double(result))
+FORWARD_RESULT(GLint, glGetAttribLocation, (GLuint p, const GLchar* n), (p, n), n, double(p), double(result))
+FORWARD_RESULT(GLint, glGetUniformLocation, (GLuint p, const GLchar* n), (p, n), n, double(p), double(result))
+FORWARD_RESULT(GLboolean, glIsProgram, (GLuint p), (p), nullptr, double(p), double(result))
+FORWARD_RESULT(GLboolean, glIsTexture, (GLuint t), (t), nullptr, double(t), double(result))
+FORWARD_RESULT(EGLContext, eglGetCurrentContext, (), (), nullptr, ptr(result))
 
 extern "C" const GLubyte* __real_glGetString(GLenum e);
 extern "C" const GLubyte* __wrap_glGetString(GLenum e) {
@@ -244,29 +220,8 @@ extern "C" const GLubyte* __wrap_glGetString(GLenum e) {
     return __real_glGetString(e);
 }
 
-extern "C" GLboolean __real_glIsProgram(GLuint p);
-extern "C" GLboolean __wrap_glIsProgram(GLuint p) {
-    GLboolean result = __real_glIsProgram(p);
-    GlRecorder::record("glIsProgram", {double(p), double(result)});
-    return result;
-}
-
-extern "C" GLboolean __real_glIsTexture(GLuint t);
-extern "C" GLboolean __wrap_glIsTexture(GLuint t) {
-    GLboolean result = __real_glIsTexture(t);
-    GlRecorder::record("glIsTexture", {double(t), double(result)});
-    return result;
-}
-
 extern "C" void __real_glShaderSource(GLuint s, GLsizei c, const GLchar* const* t, const GLint* l);
 extern "C" void __wrap_glShaderSource(GLuint s, GLsizei c, const GLchar* const* t, const GLint* l) {
     GlRecorder::record("glShaderSource", {double(s), double(c), ptr(l)}, c > 0 ? t[0] : nullptr);
     __real_glShaderSource(s, c, t, l);
-}
-
-extern "C" EGLContext __real_eglGetCurrentContext();
-extern "C" EGLContext __wrap_eglGetCurrentContext() {
-    EGLContext result = __real_eglGetCurrentContext();
-    GlRecorder::record("eglGetCurrentContext", {ptr(result)});
-    return result;
 }

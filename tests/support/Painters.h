@@ -35,48 +35,44 @@ struct Quad : vi::Drawable {
     }
 };
 
-class ColourPainter {
+// A renderer of the quad with the given fragment shader.
+class QuadPainter {
 public:
-    explicit ColourPainter(const glm::vec4& colour)
-        : colour(colour),
-          mProgram(quadVertexShader(),
-                   "precision mediump float;\n"
-                   "uniform vec4 uColour;\n"
-                   "void main() { gl_FragColor = uColour; }\n"),
-          mRenderer(mProgram, mQuad) {
+    explicit QuadPainter(const char* fragmentShader)
+        : mProgram(quadVertexShader(), fragmentShader), mRenderer(mProgram, mQuad) {
         mRenderer.addAttribute("aPosition", mQuad.positions, 2, true);
-        mRenderer.addUniform("uColour", &this->colour[0], vi::Uniform::Float4, 1);
     }
 
     vi::Renderer* renderer() { return &mRenderer; }
 
-    glm::vec4 colour;
-
-private:
+protected:
     vi::ShaderProgram mProgram;
     Quad mQuad;
     vi::Renderer mRenderer;
 };
 
-class TexturePainter {
+class ColourPainter : public QuadPainter {
 public:
-    explicit TexturePainter(vi::Texture* source)
-        : mProgram(quadVertexShader(),
-                   "precision mediump float;\n"
-                   "uniform sampler2D uSource;\n"
-                   "varying vec2 vUv;\n"
-                   "void main() { gl_FragColor = texture2D(uSource, vUv); }\n"),
-          mRenderer(mProgram, mQuad) {
-        mRenderer.addAttribute("aPosition", mQuad.positions, 2, true);
-        mRenderer.addTexture("uSource", source);
+    explicit ColourPainter(const glm::vec4& colour)
+        : QuadPainter("precision mediump float;\n"
+                      "uniform vec4 uColour;\n"
+                      "void main() { gl_FragColor = uColour; }\n"),
+          colour(colour) {
+        mRenderer.addUniform("uColour", &this->colour[0], vi::Uniform::Float4, 1);
     }
 
-    vi::Renderer* renderer() { return &mRenderer; }
+    glm::vec4 colour;
+};
 
-private:
-    vi::ShaderProgram mProgram;
-    Quad mQuad;
-    vi::Renderer mRenderer;
+class TexturePainter : public QuadPainter {
+public:
+    explicit TexturePainter(vi::Texture* source)
+        : QuadPainter("precision mediump float;\n"
+                      "uniform sampler2D uSource;\n"
+                      "varying vec2 vUv;\n"
+                      "void main() { gl_FragColor = texture2D(uSource, vUv); }\n") {
+        mRenderer.addTexture("uSource", source);
+    }
 };
 
 }  // namespace vitest

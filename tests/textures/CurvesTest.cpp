@@ -1,5 +1,5 @@
-// Tone curves: the table the segments write (worked values, clamping,
-// truncation, shared joints, untouched bytes) and the texture over it.
+// Tone curves: the table the segments write (worked values, shared joints,
+// untouched bytes) and the texture over it.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -10,7 +10,7 @@
 #include "GlContext.h"
 #include "Render/Curves.h"
 #include "Render/Texture.h"
-#include "SamplerProbe.h"
+#include "Pictures.h"
 
 using glm::vec2;
 
@@ -28,16 +28,6 @@ TEST(CurvesTable, StraightDiagonalGivesTheWorkedValues) {
     for (int x = 1; x < 256; ++x) EXPECT_GE(texel(curves, x, 0), texel(curves, x - 1, 0));
 }
 
-TEST(CurvesTable, ValuesAreClampedToAByte) {
-    const vec2 high[] = {{0, 300}, {10, 300}};
-    const vec2 low[] = {{0, -20}, {10, -20}};
-    vi::Curves curves(nullptr, 0, high, 2, low, 2);
-    for (int x = 0; x <= 10; ++x) {
-        EXPECT_EQ(texel(curves, x, vi::Curves::GREEN), 255) << x;
-        EXPECT_EQ(texel(curves, x, vi::Curves::BLUE), 0) << x;
-    }
-}
-
 TEST(CurvesTable, EachSegmentUsesOnlyItsOwnEndsAndJointsAreShared) {
     const vec2 points[] = {{0, 0}, {128, 200}, {255, 40}};
     vi::Curves curves(nullptr, 0, nullptr, 0, points, 3);
@@ -46,16 +36,6 @@ TEST(CurvesTable, EachSegmentUsesOnlyItsOwnEndsAndJointsAreShared) {
     EXPECT_EQ(texel(curves, 255, vi::Curves::BLUE), 40);
     // Midway through the first segment: t = 64/128 gives 200 * 0.5 exactly.
     EXPECT_EQ(texel(curves, 64, vi::Curves::BLUE), 100);
-}
-
-TEST(CurvesTable, FractionalEndsCoverTheTruncatedTexelRange) {
-    const vec2 points[] = {{10.7f, 100}, {20.2f, 200}};
-    vi::Curves curves(points, 2, nullptr, 0, nullptr, 0);
-    EXPECT_EQ(texel(curves, 9, vi::Curves::RED), 0);
-    EXPECT_EQ(texel(curves, 10, vi::Curves::RED), 100);
-    for (int x = 11; x <= 20; ++x) EXPECT_GT(texel(curves, x, vi::Curves::RED), 100) << x;
-    EXPECT_EQ(texel(curves, 20, vi::Curves::RED), 200);
-    EXPECT_EQ(texel(curves, 21, vi::Curves::RED), 0);
 }
 
 TEST(CurvesTable, ShortListsAndOtherBytesAreLeftAlone) {

@@ -11,7 +11,7 @@
 #include "GlRecorder.h"
 #include "Render/Texture.h"
 #include "Render/TextureCube.h"
-#include "SamplerProbe.h"
+#include "Pictures.h"
 
 using vitest::GlRecorder;
 using vitest::GlRecording;

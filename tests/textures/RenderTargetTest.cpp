@@ -16,7 +16,7 @@
 #include "Render/Drawable.h"
 #include "Render/RenderableTexture.h"
 #include "Render/Renderer.h"
-#include "SamplerProbe.h"
+#include "Pictures.h"
 
 using vitest::ColourPainter;
 using vitest::GlCall;
@@ -31,40 +31,33 @@ namespace {
 constexpr int kWindow = 64;
 const glm::vec4 kRed(1, 0, 0, 1);
 const glm::vec4 kGreen(0, 1, 0, 1);
-const glm::vec4 kBlue(0, 0, 1, 1);
-constexpr std::uint32_t kRedPixel = 0xFF0000FF, kGreenPixel = 0x00FF00FF, kBluePixel = 0x0000FFFF;
+constexpr std::uint32_t kRedPixel = 0xFF0000FF, kGreenPixel = 0x00FF00FF;
 constexpr std::uint32_t kClearPixel = 0x000000FF;
 
-// The binding as GL and the statics see it.
-struct Binding {
-    GLint frameBuffer;
-    GLint viewport[4];
-    GLuint staticFrameBuffer;
-    glm::ivec2 staticPosition, staticSize;
+// The binding as GL and the statics see it: frame buffer, viewport, then
+// the static frame buffer, position and size.
+using Binding = std::vector<int>;
 
-    static Binding now() {
-        Binding b{};
-        glGetIntegerv(GL_FRAMEBUFFER_BINDING, &b.frameBuffer);
-        glGetIntegerv(GL_VIEWPORT, b.viewport);
-        b.staticFrameBuffer = RenderableTexture::mCurrentFrameBuffer;
-        b.staticPosition = RenderableTexture::mCurrentFrameBufferPosition;
-        b.staticSize = RenderableTexture::mCurrentFrameBufferSize;
-        return b;
-    }
-    static Binding of(GLuint frameBuffer, int x, int y, int width, int height) {
-        return Binding{GLint(frameBuffer), {x, y, width, height}, frameBuffer, {x, y}, {width, height}};
-    }
-    bool operator==(const Binding& o) const {
-        return frameBuffer == o.frameBuffer && viewport[0] == o.viewport[0] && viewport[1] == o.viewport[1] &&
-               viewport[2] == o.viewport[2] && viewport[3] == o.viewport[3] &&
-               staticFrameBuffer == o.staticFrameBuffer && staticPosition == o.staticPosition &&
-               staticSize == o.staticSize;
-    }
-};
+Binding bindingNow() {
+    GLint frameBuffer = 0;
+    GLint viewport[4] = {};
+    glGetIntegerv(GL_FRAMEBUFFER_BINDING, &frameBuffer);
+    glGetIntegerv(GL_VIEWPORT, viewport);
+    const glm::ivec2 position = RenderableTexture::mCurrentFrameBufferPosition;
+    const glm::ivec2 size = RenderableTexture::mCurrentFrameBufferSize;
+    return {frameBuffer, viewport[0], viewport[1], viewport[2], viewport[3],
+            int(RenderableTexture::mCurrentFrameBuffer), position.x, position.y, size.x, size.y};
+}
 
-std::ostream& operator<<(std::ostream& out, const Binding& b) {
-    return out << "fb " << b.frameBuffer << "/" << b.staticFrameBuffer << " viewport " << b.viewport[2] << "x"
-               << b.viewport[3] << "/" << b.staticSize.x << "x" << b.staticSize.y;
+Binding bindingOf(GLuint frameBuffer, int x, int y, int width, int height) {
+    return {int(frameBuffer), x, y, width, height, int(frameBuffer), x, y, width, height};
+}
+
+// The arguments of every recorded call of `name`.
+std::vector<std::vector<double>> argumentsOf(const std::string& name) {
+    std::vector<std::vector<double>> result;
+    for (const GlCall& call : GlRecorder::callsNamed(name)) result.push_back(call.args);
+    return result;
 }
 
 std::vector<std::uint32_t> readTarget(RenderableTexture& target) {
@@ -81,16 +74,8 @@ std::uint32_t pixelOf(const std::vector<std::uint32_t>& pixels, const Renderable
 
 class RenderTargetTest : public ::testing::Test {
 protected:
-    void SetUp() override { useWindow(); }
-
-    void TearDown() override {
-        GlRecorder::stop();
-        vi::Drawable::mViewMatrix = glm::mat4(1.0f);
-        vi::Drawable::mProjectionMatrix = glm::mat4(1.0f);
-    }
-
     // What an effect does before drawing to the window.
-    void useWindow() {
+    void SetUp() override {
         RenderableTexture::mCurrentFrameBuffer = 0;
         RenderableTexture::mCurrentFrameBufferPosition = glm::ivec2(0, 0);
         RenderableTexture::mCurrentFrameBufferSize = glm::ivec2(kWindow, kWindow);
@@ -98,23 +83,31 @@ protected:
         glViewport(0, 0, kWindow, kWindow);
     }
 
+    void TearDown() override {
+        GlRecorder::stop();
+        vi::Drawable::mViewMatrix = glm::mat4(1.0f);
+        vi::Drawable::mProjectionMatrix = glm::mat4(1.0f);
+    }
+
     GlContext mContext{kWindow, kWindow};
 };
 
-TEST_F(RenderTargetTest, PassWithoutRenderersMakesNoGlCall) {
+TEST_F(RenderTargetTest, PassWithoutRenderersAndDestroyingANeverAllocatedTargetMakeNoGlCall) {
     std::vector<vi::Renderer*> none;
     RenderableTexture listless(0, 0, 8, 8, false, false, false, false, false);
     RenderableTexture empty(none, 0, 0, 8, 8, false, false, false, false, false);
     empty.allocate();
+    auto* untouched = new RenderableTexture(0, 0, 4, 4, false, false, false, false, true);
     GlRecording recording;
     listless.renderFrame();
     empty.renderFrame();
+    delete untouched;
     EXPECT_TRUE(GlRecorder::names().empty());
 }
 
 TEST_F(RenderTargetTest, AllocationAttachesTheTextureOverTheRenderbufferAndReturnsToTheWindow) {
     RenderableTexture target(0, 0, 16, 8, false, true, false, true, true);
-    const Binding before = Binding::now();
+    const Binding before = bindingNow();
     GlRecording recording;
     target.allocate();
     GlRecorder::stop();
@@ -134,7 +127,7 @@ TEST_F(RenderTargetTest, AllocationAttachesTheTextureOverTheRenderbufferAndRetur
     const std::vector<GlCall> storage = GlRecorder::callsNamed("glRenderbufferStorage");
     EXPECT_EQ(storage[0].args, (std::vector<double>{GL_RENDERBUFFER, GL_RGBA4, 16, 8}));
     EXPECT_EQ(storage[1].args, (std::vector<double>{GL_RENDERBUFFER, GL_DEPTH_COMPONENT16, 16, 8}));
-    EXPECT_EQ(Binding::now(), before);
+    EXPECT_EQ(bindingNow(), before);
 
     GlRecording again;
     target.allocate();
@@ -151,13 +144,13 @@ TEST_F(RenderTargetTest, PassDrawsWithTheTargetMatricesAndRestoresEverything) {
     const glm::mat4 projection = glm::scale(glm::mat4(1.0f), glm::vec3(2.0f, 2.0f, 1.0f));
     vi::Drawable::mViewMatrix = view;
     vi::Drawable::mProjectionMatrix = projection;
-    const Binding before = Binding::now();
+    const Binding before = bindingNow();
 
     GlRecording recording;
     target.renderFrame();
     GlRecorder::stop();
 
-    EXPECT_EQ(Binding::now(), before);
+    EXPECT_EQ(bindingNow(), before);
     EXPECT_EQ(vi::Drawable::mViewMatrix, view);
     EXPECT_EQ(vi::Drawable::mProjectionMatrix, projection);
     EXPECT_EQ(GlRecorder::callsNamed("glClearColor")[0].args, (std::vector<double>{0, 0, 0, 1}));
@@ -180,36 +173,25 @@ TEST_F(RenderTargetTest, NestedTargetIsDrawnFirstInsideTheOuterPass) {
     outer.allocate();
     const glm::mat4 view = glm::translate(glm::mat4(1.0f), glm::vec3(0.0f, 0.3f, 0.0f));
     vi::Drawable::mViewMatrix = view;
-    const Binding before = Binding::now();
+    const Binding before = bindingNow();
 
     GlRecording recording;
     outer.renderFrame();
     GlRecorder::stop();
 
-    std::vector<std::string> sequence;
-    std::vector<std::vector<double>> arguments;
-    for (const GlCall& call : GlRecorder::calls())
-        if (call.name == "glBindFramebuffer" || call.name == "glViewport" || call.name == "glClear" ||
-            call.name == "glDrawArrays") {
-            sequence.push_back(call.name);
-            arguments.push_back(call.args);
-        }
     const std::vector<std::string> expected = {
         "glBindFramebuffer", "glViewport",   "glClear",           "glBindFramebuffer", "glViewport", "glClear",
         "glDrawArrays",      "glBindFramebuffer", "glViewport",   "glDrawArrays",      "glBindFramebuffer",
         "glViewport"};
-    ASSERT_EQ(sequence, expected);
+    ASSERT_EQ(GlRecorder::names({"glBindFramebuffer", "glViewport", "glClear", "glDrawArrays"}), expected);
     const double o = outer.mFrameBuffer, i = inner.mFrameBuffer;
-    EXPECT_EQ(arguments[0], (std::vector<double>{GL_FRAMEBUFFER, o}));
-    EXPECT_EQ(arguments[1], (std::vector<double>{0, 0, 32, 32}));
-    EXPECT_EQ(arguments[3], (std::vector<double>{GL_FRAMEBUFFER, i}));
-    EXPECT_EQ(arguments[4], (std::vector<double>{0, 0, 8, 8}));
-    EXPECT_EQ(arguments[7], (std::vector<double>{GL_FRAMEBUFFER, o}));
-    EXPECT_EQ(arguments[8], (std::vector<double>{0, 0, 32, 32}));
-    EXPECT_EQ(arguments[10], (std::vector<double>{GL_FRAMEBUFFER, 0}));
-    EXPECT_EQ(arguments[11], (std::vector<double>{0, 0, kWindow, kWindow}));
+    EXPECT_EQ(argumentsOf("glBindFramebuffer"), (std::vector<std::vector<double>>{
+                                                    {GL_FRAMEBUFFER, o}, {GL_FRAMEBUFFER, i}, {GL_FRAMEBUFFER, o},
+                                                    {GL_FRAMEBUFFER, 0}}));
+    EXPECT_EQ(argumentsOf("glViewport"), (std::vector<std::vector<double>>{
+                                             {0, 0, 32, 32}, {0, 0, 8, 8}, {0, 0, 32, 32}, {0, 0, kWindow, kWindow}}));
 
-    EXPECT_EQ(Binding::now(), before);
+    EXPECT_EQ(bindingNow(), before);
     EXPECT_EQ(vi::Drawable::mViewMatrix, view);
     EXPECT_EQ(vi::Drawable::mProjectionMatrix, glm::mat4(1.0f));
     // The outer quad filled the outer viewport, not the inner one.
@@ -248,7 +230,7 @@ TEST_F(RenderTargetTest, WrittenPixelsReadBackFromThePosition) {
             ASSERT_EQ(vitest::rgba(&window[std::size_t(r * 8 + c) * 4]),
                       vitest::rgba(&pattern[std::size_t((3 + r) * 8 + 2 + c) * 4]))
                 << "row " << r << " column " << c;
-    EXPECT_EQ(Binding::now(), Binding::of(0, 0, 0, kWindow, kWindow));
+    EXPECT_EQ(bindingNow(), bindingOf(0, 0, 0, kWindow, kWindow));
 }
 
 TEST_F(RenderTargetTest, AnchorsOfTwoTargetsNest) {
@@ -256,55 +238,22 @@ TEST_F(RenderTargetTest, AnchorsOfTwoTargetsNest) {
     RenderableTexture b(0, 0, 4, 4, false, false, false, false, false);
     a.allocate();
     b.allocate();
-    const Binding window = Binding::now();
+    const Binding window = bindingNow();
 
     a.enableAnchor();
-    EXPECT_EQ(Binding::now(), Binding::of(a.mFrameBuffer, 1, 2, 8, 8));
+    EXPECT_EQ(bindingNow(), bindingOf(a.mFrameBuffer, 1, 2, 8, 8));
     b.enableAnchor();
-    EXPECT_EQ(Binding::now(), Binding::of(b.mFrameBuffer, 0, 0, 4, 4));
+    EXPECT_EQ(bindingNow(), bindingOf(b.mFrameBuffer, 0, 0, 4, 4));
     EXPECT_EQ(RenderableTexture::getViewportSize(), glm::ivec2(4, 4));
     glClearColor(0, 1, 0, 1);
     glClear(GL_COLOR_BUFFER_BIT);
     b.disableAnchor();
-    EXPECT_EQ(Binding::now(), Binding::of(a.mFrameBuffer, 1, 2, 8, 8));
+    EXPECT_EQ(bindingNow(), bindingOf(a.mFrameBuffer, 1, 2, 8, 8));
     a.disableAnchor();
-    EXPECT_EQ(Binding::now(), window);
+    EXPECT_EQ(bindingNow(), window);
 
     // What was drawn between B's anchor calls went to B.
     EXPECT_EQ(readTarget(b), std::vector<std::uint32_t>(16, kGreenPixel));
-}
-
-TEST_F(RenderTargetTest, ClearAndSingleRendererPassesUseTheCurrentMatricesAndRestore) {
-    RenderableTexture target(0, 0, 16, 16, false, false, false, false, false);
-    ColourPainter red(kRed);
-    ColourPainter green(kGreen);
-    target.mTargetProjectionMatrix = glm::scale(glm::mat4(1.0f), glm::vec3(0.1f));
-    vi::Drawable::mProjectionMatrix = glm::scale(glm::mat4(1.0f), glm::vec3(0.5f, 0.5f, 1.0f));
-    const Binding window = Binding::now();
-
-    target.clear(kBlue);
-    EXPECT_EQ(Binding::now(), window);
-    EXPECT_EQ(readTarget(target), std::vector<std::uint32_t>(256, kBluePixel));
-
-    target.renderFrame(red.renderer(), false, kGreen);
-    EXPECT_EQ(Binding::now(), window);
-    std::vector<std::uint32_t> pixels = readTarget(target);
-    EXPECT_EQ(pixelOf(pixels, target, 4, 4), kRedPixel);  // the caller's half-size projection
-    EXPECT_EQ(pixelOf(pixels, target, 1, 1), kBluePixel);
-
-    vi::Drawable::mProjectionMatrix = glm::mat4(1.0f);
-    target.renderFrame(green.renderer(), true, glm::vec4(1, 1, 1, 1));
-    pixels = readTarget(target);
-    EXPECT_EQ(pixelOf(pixels, target, 1, 1), kGreenPixel);
-    EXPECT_EQ(Binding::now(), window);
-}
-
-TEST_F(RenderTargetTest, NeverAllocatedTargetIsDestroyedWithoutAGlCall) {
-    auto* untouched = new RenderableTexture(0, 0, 4, 4, false, false, false, false, true);
-    GlRecording recording;
-    delete untouched;
-    EXPECT_TRUE(GlRecorder::names().empty());
-
 }
 
 TEST_F(RenderTargetTest, SampledDynamicTargetIsRedrawnForEveryDrawAndAStaticOneOnlyOnRequest) {

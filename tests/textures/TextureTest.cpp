@@ -1,5 +1,5 @@
 // 2D and cube textures on a real context: what each upload sends to GL and
-// when, the parameters, ETC1 data, the registry and what destruction releases.
+// when, the alignments, the parameters, ETC1 data and cube faces.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -10,17 +10,14 @@
 
 #include "GlContext.h"
 #include "GlRecorder.h"
-#include "HeapWatch.h"
 #include "Render/Texture.h"
 #include "Render/TextureCube.h"
-#include "SamplerProbe.h"
+#include "Pictures.h"
 
 using vitest::GlCall;
 using vitest::GlContext;
 using vitest::GlRecorder;
 using vitest::GlRecording;
-using vitest::HeapWatch;
-using vitest::kBigBuffer;
 using vitest::SamplerProbe;
 
 namespace {
@@ -141,30 +138,6 @@ TEST_F(TextureTest, DynamicTextureUploadsInFullAtFirstBindThenBySubImage) {
               (std::vector<double>{GL_TEXTURE_2D, 0, 0, 0, 2, 1, GL_RGBA, GL_UNSIGNED_BYTE, address(pixels.data())}));
 }
 
-TEST_F(TextureTest, AllocateKeepsAValidNameAndMakesANewOneAfterALostContext) {
-    std::uint8_t pixels[4] = {40, 80, 120, 255};
-    vi::Texture texture(pixels, 1, 1, true, false, false, false, false, 4, false);
-    GlRecording recording;
-    texture.allocate();
-    texture.allocate();
-    texture.bind(5, 1);
-    EXPECT_EQ(GlRecorder::count("glGenTextures"), 1);
-    // A static texture's bind never uploads.
-    EXPECT_EQ(GlRecorder::names(kUploads), std::vector<std::string>{"glTexImage2D"});
-
-    mContext.recreate();
-    GlRecorder::clear();
-    texture.contextChanged();
-    EXPECT_TRUE(GlRecorder::names().empty());
-
-    texture.allocate();
-    EXPECT_EQ(GlRecorder::count("glGenTextures"), 1);
-    EXPECT_EQ(GlRecorder::names(kUploads), std::vector<std::string>{"glTexImage2D"});
-    GlRecorder::stop();
-    SamplerProbe probe(SamplerProbe::Flat);
-    EXPECT_EQ(probe.draw(texture, 1, 1), (std::vector<std::uint32_t>{0x285078FF}));
-}
-
 TEST_F(TextureTest, Etc1UploadsInFullWithHalfAByteATexelAndDecodes) {
     // Four blocks in raster order, each with two colours.
     const int colours[4][2][3] = {{{15, 0, 0}, {0, 15, 0}},
@@ -193,6 +166,51 @@ TEST_F(TextureTest, Etc1UploadsInFullWithHalfAByteATexelAndDecodes) {
             EXPECT_EQ(first[std::size_t(y * 8 + x)], etc1Texel(colours[block][(x % 4) < 2 ? 0 : 1]))
                 << "texel " << x << ", " << y;
         }
+}
+
+// Square faces of 2 x 2 texels (cube faces must be square), a left and a
+// right colour on each, different on every face.
+struct CubeFaces {
+    std::uint32_t colours[6][2];
+    std::vector<std::uint8_t> bytes[6];
+    void* faces[6];
+    unsigned int sizes[6] = {2, 2, 2, 2, 2, 2};
+
+    CubeFaces() {
+        for (int f = 0; f < 6; ++f) {
+            for (int t = 0; t < 2; ++t)
+                colours[f][t] = std::uint32_t(0x20 * (f + 1)) << 24 | std::uint32_t(0x40 * t + 0x10) << 16 |
+                                std::uint32_t(0xF0 - 0x20 * f) << 8 | 0xFF;
+            for (int texel = 0; texel < 4; ++texel)
+                for (int shift = 24; shift >= 0; shift -= 8)
+                    bytes[f].push_back(std::uint8_t(colours[f][texel % 2] >> shift));
+            faces[f] = bytes[f].data();
+        }
+    }
+};
+
+TEST_F(TextureTest, CubeUploadsItsSixFacesInOrderAsRgbaBytesAndSamplesThem) {
+    CubeFaces cube;
+    vi::TextureCube texture(cube.faces, cube.sizes, cube.sizes, true, false, false, false, false);
+
+    GlRecording recording;
+    texture.allocate();
+    GlRecorder::stop();
+    const std::vector<GlCall> images = GlRecorder::callsNamed("glTexImage2D");
+    ASSERT_EQ(images.size(), 6u);
+    for (int f = 0; f < 6; ++f)
+        EXPECT_EQ(images[std::size_t(f)].args,
+                  (std::vector<double>{double(GL_TEXTURE_CUBE_MAP_POSITIVE_X + f), 0, GL_RGBA, 2, 2, 0, GL_RGBA,
+                                       GL_UNSIGNED_BYTE, address(cube.faces[f])}));
+
+    // Aimed at the left half of each face (s < 0.5), then at the right of +X.
+    SamplerProbe probe(SamplerProbe::Cube);
+    EXPECT_EQ(probe.look(texture, 1.0f, 0.0f, 0.5f), cube.colours[0][0]);    // +X: s from -z
+    EXPECT_EQ(probe.look(texture, -1.0f, 0.0f, -0.5f), cube.colours[1][0]);  // -X: s from +z
+    EXPECT_EQ(probe.look(texture, -0.5f, 1.0f, 0.0f), cube.colours[2][0]);   // +Y: s from +x
+    EXPECT_EQ(probe.look(texture, -0.5f, -1.0f, 0.0f), cube.colours[3][0]);  // -Y: s from +x
+    EXPECT_EQ(probe.look(texture, -0.5f, 0.0f, 1.0f), cube.colours[4][0]);   // +Z: s from +x
+    EXPECT_EQ(probe.look(texture, 0.5f, 0.0f, -1.0f), cube.colours[5][0]);   // -Z: s from -x
 }
 
 TEST_F(TextureTest, DestructionDeletesTheNameUnlessShared) {
@@ -253,69 +271,6 @@ TEST_F(TextureTest, DestructionRemovesTheFirstRegistryEntryOnlyAndKeepsTheOrder)
     delete a;
     delete c;
     EXPECT_EQ(vi::Texture::mAllTextures.size(), base);
-}
-
-// Square faces of 2 x 2 texels (cube faces must be square), a left and a
-// right colour on each, different on every face.
-struct CubeFaces {
-    std::uint32_t colours[6][2];
-    std::vector<std::uint8_t> bytes[6];
-    void* faces[6];
-    unsigned int sizes[6] = {2, 2, 2, 2, 2, 2};
-
-    CubeFaces() {
-        for (int f = 0; f < 6; ++f) {
-            for (int t = 0; t < 2; ++t)
-                colours[f][t] = std::uint32_t(0x20 * (f + 1)) << 24 | std::uint32_t(0x40 * t + 0x10) << 16 |
-                                std::uint32_t(0xF0 - 0x20 * f) << 8 | 0xFF;
-            for (int texel = 0; texel < 4; ++texel)
-                for (int shift = 24; shift >= 0; shift -= 8)
-                    bytes[f].push_back(std::uint8_t(colours[f][texel % 2] >> shift));
-            faces[f] = bytes[f].data();
-        }
-    }
-};
-
-TEST_F(TextureTest, CubeUploadsItsSixFacesInOrderAsRgbaBytesAndSamplesThem) {
-    CubeFaces cube;
-    vi::TextureCube texture(cube.faces, cube.sizes, cube.sizes, true, false, false, false, false);
-
-    GlRecording recording;
-    texture.allocate();
-    GlRecorder::stop();
-    const std::vector<GlCall> images = GlRecorder::callsNamed("glTexImage2D");
-    ASSERT_EQ(images.size(), 6u);
-    for (int f = 0; f < 6; ++f)
-        EXPECT_EQ(images[std::size_t(f)].args,
-                  (std::vector<double>{double(GL_TEXTURE_CUBE_MAP_POSITIVE_X + f), 0, GL_RGBA, 2, 2, 0, GL_RGBA,
-                                       GL_UNSIGNED_BYTE, address(cube.faces[f])}));
-
-    // Aimed at the left half of each face (s < 0.5), then at the right of +X.
-    SamplerProbe probe(SamplerProbe::Cube);
-    EXPECT_EQ(probe.look(texture, 1.0f, 0.0f, 0.5f), cube.colours[0][0]);    // +X: s from -z
-    EXPECT_EQ(probe.look(texture, -1.0f, 0.0f, -0.5f), cube.colours[1][0]);  // -X: s from +z
-    EXPECT_EQ(probe.look(texture, -0.5f, 1.0f, 0.0f), cube.colours[2][0]);   // +Y: s from +x
-    EXPECT_EQ(probe.look(texture, -0.5f, -1.0f, 0.0f), cube.colours[3][0]);  // -Y: s from +x
-    EXPECT_EQ(probe.look(texture, -0.5f, 0.0f, 1.0f), cube.colours[4][0]);   // +Z: s from +x
-    EXPECT_EQ(probe.look(texture, 0.5f, 0.0f, -1.0f), cube.colours[5][0]);   // -Z: s from -x
-}
-
-TEST_F(TextureTest, DynamicCubeReuploadsEveryFaceBySubImage) {
-    CubeFaces cube;
-    vi::TextureCube texture(cube.faces, cube.sizes, cube.sizes, false, true, false, true, false);
-    texture.allocate();
-    GlRecording recording;
-    texture.bind(0, 0);
-    texture.bind(0, 0);
-    GlRecorder::stop();
-    std::vector<std::string> expected(6, "glTexImage2D");
-    expected.resize(12, "glTexSubImage2D");
-    EXPECT_EQ(GlRecorder::names(kUploads), expected);
-    const std::vector<GlCall> subImages = GlRecorder::callsNamed("glTexSubImage2D");
-    for (int f = 0; f < 6; ++f) {
-        EXPECT_EQ(subImages[std::size_t(f)].args[0], double(GL_TEXTURE_CUBE_MAP_POSITIVE_X + f));
-        EXPECT_EQ(subImages[std::size_t(f)].args[8], address(cube.faces[f]));
-    }
 }
 
 }  // namespace

@@ -31,18 +31,8 @@ public final class TestHost {
 
     /** A headless GL context, made once, current on the calling thread. */
     public static native void makeContextCurrent(int width, int height);
-    public static native void releaseContext();
     /** One pixel of the current framebuffer as 0xRRGGBBAA. */
     public static native int readPixel(int x, int y);
-
-    /** The runtime's key handler with any code, including the developer keys. */
-    public static native void pressKey(int key);
-
-    public static native void seedRandom(long seed);
-    public static native long nextRandom();
-
-    /** left, top, width, height */
-    public static native int[] windowRectangle();
     public static native boolean hasScene();
     /** The dynamic loader's pending error, or null; reading it clears it. */
     public static native String loaderError();

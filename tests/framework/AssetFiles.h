@@ -1,57 +1,19 @@
 #pragma once
 
-// What the file, model and lighting tests set up: a private directory that
-// serves as the asset directory and the external-storage directory, files
-// written into it, and model files in the runtime's binary format.
+// What the file, model and lighting tests set up: a scratch directory that
+// serves as the asset directory and the external-storage directory, and model
+// files in the runtime's binary format.
 
 #include <cstdint>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
-#include <string>
 #include <vector>
 
 #include <glm/glm.hpp>
 
+#include "Scratch.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/File.h"
 
 namespace vitest {
-
-// A fresh directory under /tmp, removed with everything in it at the end.
-class ScratchDirectory {
-public:
-    ScratchDirectory() {
-        char pattern[] = "/tmp/vi-framework-XXXXXX";
-        mPath = mkdtemp(pattern);
-    }
-    ~ScratchDirectory() { std::filesystem::remove_all(mPath); }
-
-    ScratchDirectory(const ScratchDirectory&) = delete;
-    ScratchDirectory& operator=(const ScratchDirectory&) = delete;
-
-    const std::string& path() const { return mPath; }
-    std::string pathOf(const std::string& name) const { return mPath + "/" + name; }
-
-    void write(const std::string& name, const std::vector<char>& bytes) const {
-        std::filesystem::create_directories(std::filesystem::path(pathOf(name)).parent_path());
-        std::ofstream out(pathOf(name), std::ios::binary);
-        out.write(bytes.data(), std::streamsize(bytes.size()));
-    }
-    void write(const std::string& name, const std::string& text) const {
-        write(name, std::vector<char>(text.begin(), text.end()));
-    }
-    std::vector<char> read(const std::string& name) const {
-        std::ifstream in(pathOf(name), std::ios::binary);
-        return std::vector<char>(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-    }
-    bool exists(const std::string& name) const { return std::filesystem::exists(pathOf(name)); }
-
-private:
-    std::string mPath;
-};
 
 // A scratch directory installed as the process's asset manager (and as the
 // external-storage directory) for the lifetime of the object.

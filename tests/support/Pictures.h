@@ -1,15 +1,18 @@
 #pragma once
 
-// What the texture tests look through: a program of the tests' own that draws
-// a texture over the whole viewport (2D: one texel per pixel when the viewport
-// has the texture's size; cube: the colour seen in one direction), and pixel
-// helpers. The texture is bound with its own bind(), as a renderer would.
+// Pictures on the real context, as the tests draw and read them back: pixels
+// as 0xRRGGBBAA words or as comparable channels, a texture over pixels the
+// test keeps, uniform values as the program holds them, and a program of the
+// tests' own that draws a texture over the whole viewport (2D: one texel per
+// pixel when the viewport has the texture's size; cube: the colour seen in one
+// direction), bound with the texture's own bind(), as a renderer would.
 
 #include <GLES2/gl2.h>
 
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <ostream>
 #include <vector>
 
 #include "GlContext.h"
@@ -21,6 +24,68 @@ namespace vitest {
 inline std::uint32_t rgba(const std::uint8_t* p) {
     return (std::uint32_t(p[0]) << 24) | (std::uint32_t(p[1]) << 16) | (std::uint32_t(p[2]) << 8) | p[3];
 }
+
+// The current framebuffer's rectangle as 0xRRGGBBAA words, bottom row first.
+inline std::vector<std::uint32_t> readWords(int x, int y, int width, int height) {
+    const std::vector<std::uint8_t> bytes = readPixels(x, y, width, height);
+    std::vector<std::uint32_t> words;
+    for (std::size_t i = 0; i < bytes.size(); i += 4) words.push_back(rgba(&bytes[i]));
+    return words;
+}
+
+// The first n floats of a uniform as the program holds it.
+inline std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
+    std::vector<float> values(16, -99.0f);
+    glGetUniformfv(program, glGetUniformLocation(program, name), values.data());
+    values.resize(std::size_t(n));
+    return values;
+}
+
+
+struct Rgba {
+    int r, g, b, a;
+    bool operator==(const Rgba& o) const { return r == o.r && g == o.g && b == o.b && a == o.a; }
+    // Every channel within `tolerance` of the other's.
+    bool near(const Rgba& o, int tolerance) const {
+        return std::abs(r - o.r) <= tolerance && std::abs(g - o.g) <= tolerance && std::abs(b - o.b) <= tolerance &&
+               std::abs(a - o.a) <= tolerance;
+    }
+};
+
+inline std::ostream& operator<<(std::ostream& out, const Rgba& c) {
+    return out << "(" << c.r << ", " << c.g << ", " << c.b << ", " << c.a << ")";
+}
+
+inline Rgba pixelAt(int x, int y) {
+    std::vector<std::uint8_t> p = readPixels(x, y, 1, 1);
+    return Rgba{p[0], p[1], p[2], p[3]};
+}
+
+// A static, clamped, nearest-filtered RGBA texture over rows of texels given
+// first row first. The pixels live as long as the texture.
+class PixelTexture {
+public:
+    PixelTexture(unsigned int width, unsigned int height, const std::vector<Rgba>& texels)
+        : mPixels(toBytes(texels)), mTexture(mPixels.data(), width, height, true, false, false, false, false, 4, false) {}
+
+    vi::Texture& texture() { return mTexture; }
+
+private:
+    static std::vector<std::uint8_t> toBytes(const std::vector<Rgba>& texels) {
+        std::vector<std::uint8_t> bytes(texels.size() * 4);
+        for (std::size_t i = 0; i < texels.size(); ++i) {
+            bytes[4 * i] = std::uint8_t(texels[i].r);
+            bytes[4 * i + 1] = std::uint8_t(texels[i].g);
+            bytes[4 * i + 2] = std::uint8_t(texels[i].b);
+            bytes[4 * i + 3] = std::uint8_t(texels[i].a);
+        }
+        return bytes;
+    }
+
+    std::vector<std::uint8_t> mPixels;
+    vi::Texture mTexture;
+};
+
 
 class SamplerProbe {
 public:
@@ -71,10 +136,7 @@ public:
         glUseProgram(mProgram);
         texture.bind(unsigned(mSampler), unit);
         drawQuad();
-        std::vector<std::uint8_t> bytes = readPixels(0, 0, width, height);
-        std::vector<std::uint32_t> result;
-        for (std::size_t i = 0; i < bytes.size(); i += 4) result.push_back(rgba(&bytes[i]));
-        return result;
+        return readWords(0, 0, width, height);
     }
 
     // The colour a cube texture shows in direction (x, y, z).
