@@ -9,8 +9,10 @@
 #include "GlContext.h"
 #include "Pictures.h"
 #include "GlRecorder.h"
+#include "Painters.h"
 #include "Render/Background.h"
 #include "Render/BackgroundRenderer.h"
+#include "Render/RenderableTexture.h"
 #include "Render/Renderer.h"
 
 using vitest::GlRecorder;

@@ -8,10 +8,12 @@
 
 #include <glm/gtc/matrix_transform.hpp>
 
+#include "AssetFiles.h"
 #include "GlContext.h"
 #include "Pictures.h"
 #include "GlRecorder.h"
 #include "Render/LightRenderer.h"
+#include "Render/ModelObject.h"
 
 using vitest::pixelAt;
 using vitest::PixelTexture;
@@ -20,6 +22,7 @@ using vitest::Rgba;
 namespace {
 
 const Rgba kTexel{200, 100, 50, 255};
+const Rgba kClearBlue{0, 0, 255, 255};
 
 // A face filling the viewport, facing +z, in one colour; the lighting
 // variables are the test's own and are read at every draw.

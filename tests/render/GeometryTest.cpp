@@ -3,6 +3,7 @@
 
 #include <glm/gtc/matrix_transform.hpp>
 
+#include <string>
 #include <vector>
 
 #include "Render/GL.h"
@@ -16,6 +17,21 @@ void expectNear(const glm::vec3& actual, const glm::vec3& expected, float tolera
     EXPECT_NEAR(actual.y, expected.y, tolerance);
     EXPECT_NEAR(actual.z, expected.z, tolerance);
 }
+
+// Records which virtual slots the base class goes through.
+class SlotLog : public vi::Geometry {
+public:
+    void construct() override {
+        log += "construct ";
+        Geometry::construct();
+    }
+    void update() override { log += "update "; }
+    void clear() override {
+        log += "clear ";
+        Geometry::clear();
+    }
+    std::string log;
+};
 
 }  // namespace
 

@@ -10,6 +10,7 @@
 
 #include "GlContext.h"
 #include "GlRecorder.h"
+#include "HeapWatch.h"
 #include "Render/Texture.h"
 #include "Render/TextureCube.h"
 #include "Pictures.h"
@@ -18,6 +19,8 @@ using vitest::GlCall;
 using vitest::GlContext;
 using vitest::GlRecorder;
 using vitest::GlRecording;
+using vitest::HeapWatch;
+using vitest::kBigBuffer;
 using vitest::SamplerProbe;
 
 namespace {
