@@ -34,8 +34,15 @@ void* countedNew(std::size_t size) {
 
 }  // namespace
 
+// Every form that the replaced deletes below free, the nothrow ones too: the
+// GL driver's compiler allocates with those and frees through operator delete.
 void* operator new(std::size_t size) { return countedNew(size); }
 void* operator new[](std::size_t size) { return countedNew(size); }
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+    if (gCounting) ++gNewCount;
+    return std::malloc(size ? size : 1);
+}
+void* operator new[](std::size_t size, const std::nothrow_t& tag) noexcept { return operator new(size, tag); }
 void operator delete(void* p) noexcept { std::free(p); }
 void operator delete[](void* p) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t) noexcept { std::free(p); }
