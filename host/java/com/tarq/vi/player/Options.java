@@ -22,7 +22,8 @@ final class Options {
         "                       renders repeat bit for bit (default: real time, paced)",
         "  --out DIR            output folder (default out); replaced only if the player wrote it",
         "  --sheet N            frames on the contact sheet (default 8)",
-        "  --quiet              no progress");
+        "  --quiet              no progress",
+        "  --help               this text");
 
     Path plugin;
     Path timeline;
@@ -36,6 +37,7 @@ final class Options {
     Path out = Path.of("out");
     int sheetFrames = 8;
     boolean quiet;
+    boolean help;
 
     /** Thrown for a command line the player cannot use; the message says why. */
     static final class UsageException extends Exception {
@@ -56,6 +58,10 @@ final class Options {
                 continue;
             }
             switch (arg) {
+                case "--help" -> {
+                    options.help = true;
+                    return options;
+                }
                 case "--fixed-step" -> options.fixedStep = true;
                 case "--quiet" -> options.quiet = true;
                 case "--timeline" -> options.timeline = Path.of(value(args, ++i, arg));

@@ -40,7 +40,10 @@ final class Pictures implements AutoCloseable {
     private final List<BufferedImage> sheetCells = new ArrayList<>();
     private final ImageWriter gifWriter;
     private final ImageOutputStream gifStream;
+    /** The first frame carries the looping extension; the rest only their delay. */
+    private final IIOMetadata gifFirstFrameMetadata;
     private final IIOMetadata gifFrameMetadata;
+    private boolean gifStarted;
     private boolean gifClosed;
 
     Pictures(Path folder, int width, int height, int fps, int frameCount, int sheetFrames) throws IOException {
@@ -59,7 +62,9 @@ final class Pictures implements AutoCloseable {
         gifWriter = ImageIO.getImageWritersByFormatName("gif").next();
         gifStream = ImageIO.createImageOutputStream(folder.resolve(PREVIEW).toFile());
         gifWriter.setOutput(gifStream);
-        gifFrameMetadata = frameMetadata(Math.max(1, Math.round(100f * previewEvery / fps)));
+        int delay = Math.max(1, Math.round(100f * previewEvery / fps));
+        gifFirstFrameMetadata = frameMetadata(delay, true);
+        gifFrameMetadata = frameMetadata(delay, false);
         gifWriter.prepareWriteSequence(null);
     }
 
@@ -76,8 +81,9 @@ final class Pictures implements AutoCloseable {
             sheetCells.add(cell);
         }
         if (index % previewEvery == 0) {
-            gifWriter.writeToSequence(new IIOImage(fitted(frame, previewWidth, previewHeight), null, gifFrameMetadata),
-                null);
+            IIOMetadata metadata = gifStarted ? gifFrameMetadata : gifFirstFrameMetadata;
+            gifWriter.writeToSequence(new IIOImage(fitted(frame, previewWidth, previewHeight), null, metadata), null);
+            gifStarted = true;
         }
     }
 
@@ -122,8 +128,8 @@ final class Pictures implements AutoCloseable {
         return box;
     }
 
-    /** Per-frame GIF metadata: the delay, no disposal, and (read on the first frame) endless looping. */
-    private IIOMetadata frameMetadata(int delayHundredths) throws IOException {
+    /** Per-frame GIF metadata: the delay, no disposal, and, when asked, endless looping. */
+    private IIOMetadata frameMetadata(int delayHundredths, boolean loop) throws IOException {
         ImageTypeSpecifier type = ImageTypeSpecifier.createFromBufferedImageType(BufferedImage.TYPE_INT_RGB);
         IIOMetadata metadata = gifWriter.getDefaultImageMetadata(type, null);
         String format = metadata.getNativeMetadataFormatName();
@@ -136,12 +142,14 @@ final class Pictures implements AutoCloseable {
         control.setAttribute("delayTime", Integer.toString(delayHundredths));
         control.setAttribute("transparentColorIndex", "0");
 
-        IIOMetadataNode extensions = child(root, "ApplicationExtensions");
-        IIOMetadataNode loop = new IIOMetadataNode("ApplicationExtension");
-        loop.setAttribute("applicationID", "NETSCAPE");
-        loop.setAttribute("authenticationCode", "2.0");
-        loop.setUserObject(new byte[] {1, 0, 0});
-        extensions.appendChild(loop);
+        if (loop) {
+            IIOMetadataNode extensions = child(root, "ApplicationExtensions");
+            IIOMetadataNode repeat = new IIOMetadataNode("ApplicationExtension");
+            repeat.setAttribute("applicationID", "NETSCAPE");
+            repeat.setAttribute("authenticationCode", "2.0");
+            repeat.setUserObject(new byte[] {1, 0, 0});  // sub-block 1: repeat count 0, for ever
+            extensions.appendChild(repeat);
+        }
 
         metadata.setFromTree(format, root);
         return metadata;

@@ -54,7 +54,11 @@ public final class Player {
         int status;
         try {
             Options options = Options.parse(args);
-            new Player(options).run();
+            if (options.help) {
+                System.out.println(Options.USAGE);
+            } else {
+                new Player(options).run();
+            }
             status = 0;
         } catch (Options.UsageException e) {
             System.err.println("vi-player: " + e.getMessage());
@@ -64,6 +68,10 @@ public final class Player {
             System.err.println("vi-player: " + e.getMessage());
             status = 1;
         } catch (IOException e) {
+            System.err.println("vi-player: " + e.getMessage());
+            status = 1;
+        } catch (IllegalStateException | UnsatisfiedLinkError e) {
+            // The headless surface or a library of the player's own: no use going on.
             System.err.println("vi-player: " + e.getMessage());
             status = 1;
         }
@@ -112,8 +120,13 @@ public final class Player {
 
     private void play(Path plugin, Timeline timeline, Map<String, Image> images, int frames, Pictures pictures)
             throws Failure, IOException {
-        System.load(System.getProperty("vi.runtime"));
-        System.load(System.getProperty("vi.desktop"));
+        String runtime = System.getProperty("vi.runtime");
+        String desktop = System.getProperty("vi.desktop");
+        if (runtime == null || desktop == null) {
+            throw new Failure("the runtime's and the player's libraries are not named; start the player with vi-player");
+        }
+        System.load(runtime);
+        System.load(desktop);
         Desktop.open(width, height);
         pixels = new int[width * height];
         if (options.fixedStep && !Desktop.setClock(FIXED_CLOCK_START)) {
