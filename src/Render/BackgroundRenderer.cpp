@@ -37,9 +37,7 @@ const char* const kFragmentSource =
 
 ShaderProgram* BackgroundRenderer::getShaderProgram() {
     // Counted on every call, also from outside: such a caller keeps the program alive.
-    ++msUseCount;
-    if (!msShaderProgram) msShaderProgram = new ShaderProgram(kVertexSource, kFragmentSource);
-    return msShaderProgram;
+    return ShaderProgram::acquireShared(msShaderProgram, msUseCount, kVertexSource, kFragmentSource);
 }
 
 BackgroundRenderer::BackgroundRenderer(Drawable& drawable) : Renderer(*getShaderProgram(), drawable) {
@@ -47,14 +45,6 @@ BackgroundRenderer::BackgroundRenderer(Drawable& drawable) : Renderer(*getShader
     addTexture("uTexture", drawable.texture);
 }
 
-BackgroundRenderer::~BackgroundRenderer() {
-    if (msShaderProgram) {
-        --msUseCount;
-        if (msUseCount == 0) {
-            delete msShaderProgram;
-            msShaderProgram = nullptr;
-        }
-    }
-}
+BackgroundRenderer::~BackgroundRenderer() { ShaderProgram::releaseShared(msShaderProgram, msUseCount); }
 
 }  // namespace vi

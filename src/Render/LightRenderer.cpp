@@ -61,9 +61,7 @@ const char* const kFragmentSource =
 
 ShaderProgram* LightRenderer::getShaderProgram() {
     // Counted on every call, also from outside: such a caller keeps the program alive.
-    ++msUseCount;
-    if (!msShaderProgram) msShaderProgram = new ShaderProgram(kVertexSource, kFragmentSource);
-    return msShaderProgram;
+    return ShaderProgram::acquireShared(msShaderProgram, msUseCount, kVertexSource, kFragmentSource);
 }
 
 LightRenderer::LightRenderer(Drawable& drawable) : Renderer(*getShaderProgram(), drawable) {
@@ -73,14 +71,6 @@ LightRenderer::LightRenderer(Drawable& drawable) : Renderer(*getShaderProgram(),
     addTexture("uTexture", drawable.texture);
 }
 
-LightRenderer::~LightRenderer() {
-    if (msShaderProgram) {
-        --msUseCount;
-        if (msUseCount == 0) {
-            delete msShaderProgram;
-            msShaderProgram = nullptr;
-        }
-    }
-}
+LightRenderer::~LightRenderer() { ShaderProgram::releaseShared(msShaderProgram, msUseCount); }
 
 }  // namespace vi

@@ -91,4 +91,20 @@ GLuint ShaderProgram::compileShader(bool isVertex, const std::string& source) co
     failWithInfoLog(infoLog, kCompileFailureLine, __func__);
 }
 
+ShaderProgram* ShaderProgram::acquireShared(ShaderProgram*& program, unsigned int& useCount,
+                                           const char* vertexSource, const char* fragmentSource) {
+    ++useCount;
+    if (!program) program = new ShaderProgram(vertexSource, fragmentSource);
+    return program;
+}
+
+void ShaderProgram::releaseShared(ShaderProgram*& program, unsigned int& useCount) {
+    if (!program) return;
+    --useCount;
+    if (useCount == 0) {
+        delete program;
+        program = nullptr;
+    }
+}
+
 }  // namespace vi

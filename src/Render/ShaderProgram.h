@@ -23,6 +23,13 @@ public:
     void init();
     GLuint compileShader(bool isVertex, const std::string& source) const;
 
+    // For renderer classes whose instances share one program kept in their own
+    // statics: every acquire counts a user (and builds the program for the
+    // first), every release gives one back and deletes the program at zero.
+    static ShaderProgram* acquireShared(ShaderProgram*& program, unsigned int& useCount, const char* vertexSource,
+                                        const char* fragmentSource);
+    static void releaseShared(ShaderProgram*& program, unsigned int& useCount);
+
     std::string vertexSource;
     std::string fragmentSource;
     GLuint program;
