@@ -56,7 +56,7 @@ SampleFrames countSampleFrames(const std::string& pluginPath, int frames) {
         std::fprintf(stderr, "bench: cannot open the sample: %s\n", dlerror());
         return result;
     }
-    vi::gCreateScene = reinterpret_cast<CreateSceneFunction>(dlsym(handle, "createScene"));
+    vi::gCreateScene = reinterpret_cast<vi::CreateSceneFunction>(dlsym(handle, "createScene"));
     if (!vi::gCreateScene) return result;
     if (!AllocationCounter::watchLibrary("libtarqvevyncommon") || !AllocationCounter::watchLibrary(pluginPath.c_str()))
         return result;

@@ -66,7 +66,7 @@ public:
         mContext = new vitest::GlContext(kWidth, kHeight);
         void* library = dlopen(RIPPLE_LIBRARY, RTLD_NOW);
         ASSERT_NE(library, nullptr) << dlerror();
-        vi::gCreateScene = reinterpret_cast<CreateSceneFunction>(dlsym(library, "createScene"));
+        vi::gCreateScene = reinterpret_cast<vi::CreateSceneFunction>(dlsym(library, "createScene"));
         ASSERT_NE(vi::gCreateScene, nullptr);
         vi::File::getAssetManager() = vi::DirectoryAssetManager::create(RIPPLE_ASSETS);
     }

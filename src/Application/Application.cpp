@@ -3,6 +3,7 @@
 #include <pthread.h>
 
 #include <cstddef>
+#include <cstdio>
 #include <cstdlib>
 
 #include "Application/AnimationManager.h"
@@ -44,9 +45,15 @@ void stopScene() {
     unlock();
 }
 
+// The entry of mInitialised for the scene's current orientation: any value
+// the host sent maps to one of the two entries, never past them.
+bool& initialisedForCurrentOrientation(Scene& scene) {
+    return scene.mInitialised[Orientation::initialisedIndex(scene.mOrientation)];
+}
+
 }  // namespace
 
-bool Application::isReady() { return gpScene && gpScene->mInitialised[gpScene->mOrientation]; }
+bool Application::isReady() { return gpScene && initialisedForCurrentOrientation(*gpScene); }
 
 glm::vec2 Application::mouseNormalize(int x, int y) {
     // y is flipped: the bottom edge of the window is 0, the top edge 1.
@@ -56,8 +63,10 @@ glm::vec2 Application::mouseNormalize(int x, int y) {
 
 // --- Lifecycle ---------------------------------------------------------------
 
-std::vector<std::string>& Application::handleStart(int left, int top, int width, int height) {
-    lock();
+namespace {
+
+// Steps 2 to 6 of a start; callers hold the lock.
+void startScene(int left, int top, int width, int height) {
     storeWindowRectangle(left, top, width, height);
     Timer::restart();
     ContextRecovery::invalidateIfLost();
@@ -65,9 +74,28 @@ std::vector<std::string>& Application::handleStart(int left, int top, int width,
     if (gpScene) delete gpScene;
     int size[2] = {ApplicationVar::msWindowWidth, ApplicationVar::msWindowHeight};
     gpScene = gCreateScene(size, &ApplicationVar::msModelsMap, &ApplicationVar::msTexturesMap);
+}
+
+}  // namespace
+
+std::vector<std::string>& Application::handleStart(int left, int top, int width, int height) {
+    lock();
+    startScene(left, top, width, height);
     std::vector<std::string>& names = gpScene->mNames;
     unlock();
     return names;
+}
+
+void Application::handleStart(int left, int top, int width, int height, std::vector<std::string>& namesCopy) {
+    lock();
+    startScene(left, top, width, height);
+    // A count no vector can hold cannot be copied: the host gets no answer.
+    if (gpScene->mNames.size() > namesCopy.max_size()) {
+        std::puts("out of memory\n");
+        std::abort();
+    }
+    namesCopy = gpScene->mNames;
+    unlock();
 }
 
 void Application::handleInitEffect() {
@@ -75,12 +103,13 @@ void Application::handleInitEffect() {
     if (gpScene) {
         // Restarted also when the scene is already initialised.
         Timer::restart();
-        if (!gpScene->mInitialised[gpScene->mOrientation]) {
+        bool& initialised = initialisedForCurrentOrientation(*gpScene);
+        if (!initialised) {
             if (gpScene->mOrientation == Orientation::Initial)
                 gpScene->initEffect();
             else
                 gpScene->initEffectAlternate();
-            gpScene->mInitialised[gpScene->mOrientation] = true;
+            initialised = true;
         }
     }
     unlock();

@@ -19,6 +19,10 @@ class VI_EXPORT Application {
 public:
     // Lifecycle and one-shot events.
     static std::vector<std::string>& handleStart(int left, int top, int width, int height);
+    // The same start, with the new scene's names copied before the lock is
+    // released: a stop on another thread cannot free them under the copy.
+    // What the host's start entry point uses.
+    static void handleStart(int left, int top, int width, int height, std::vector<std::string>& namesCopy);
     static void handleInitEffect();
     static void handleWindowRectangle(int left, int top, int width, int height);
     static void handleRestart();

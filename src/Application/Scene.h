@@ -56,7 +56,8 @@ public:
     glm::vec2 mSize;
     float mAspect;
     glm::vec2 mScale;
-    // Indexed by orientation; the constructor must leave both false.
+    // Entry Orientation::initialisedIndex(o) is true once the scene was
+    // initialised for orientation o; the constructor must leave both false.
     bool mInitialised[2];
     Orientation::OrientationEnum mOrientation;
     std::vector<std::string> mNames;
@@ -65,10 +66,9 @@ public:
 typedef std::map<std::string, ModelObject*> ModelsMap;
 typedef std::map<std::string, Texture*> TexturesMap;
 
-}  // namespace vi
+// What the plug-in's factory, exported unmangled as "createScene", must be:
+// window size (two ints, width then height), the shared models map, the shared
+// textures map; returns a new scene owned by the runtime.
+typedef Scene* (*CreateSceneFunction)(int* size, ModelsMap* models, TexturesMap* textures);
 
-extern "C" {
-// What "createScene" must be: window size (two ints), the shared models map,
-// the shared textures map; returns a new scene owned by the runtime.
-typedef vi::Scene* (*CreateSceneFunction)(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);
-}
+}  // namespace vi

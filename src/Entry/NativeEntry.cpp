@@ -5,8 +5,6 @@
 // loadTexture lives with the host's texture loading.
 #include <jni.h>
 
-#include <cstdio>
-#include <cstdlib>
 #include <dlfcn.h>
 #include <string>
 #include <vector>
@@ -42,14 +40,9 @@ JNIEXPORT jobjectArray JNICALL VI_NATIVE(prehandleStart)(JNIEnv* env, jobject, j
     if (!vi::EffectLibrary::load(path)) return nullptr;
     env->ReleaseStringUTFChars(libraryPath, path);
 
-    std::vector<std::string>& names = vi::Application::handleStart(0, 0, width, height);
-    std::vector<std::string> copy;
-    if (names.size() > copy.max_size()) {
-        std::puts("out of memory\n");
-        std::abort();
-    }
-    copy = names;
-    return toStringArray(env, copy);
+    std::vector<std::string> names;
+    vi::Application::handleStart(0, 0, width, height, names);
+    return toStringArray(env, names);
 }
 
 JNIEXPORT jint JNICALL VI_NATIVE(prehandleInitEffect)(JNIEnv*, jobject) {

@@ -1,7 +1,10 @@
 #pragma once
 
 // A cube map of six faces, uploaded as RGBA bytes (or ETC1) in the order
-// +X, -X, +Y, -Y, +Z, -Z. When deletable, frees each face buffer with free.
+// +X, -X, +Y, -Y, +Z, -Z, each from its own pointer in mFaces; mBuffer stays
+// null. When deletable, frees each face buffer once with free. Texture
+// recycling leaves the faces alone, so a lost context re-creates the cube
+// from them.
 
 #include <vector>
 

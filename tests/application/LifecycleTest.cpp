@@ -1,5 +1,6 @@
 // Starting, initialising, re-orienting, restarting and stopping the scene, and
 // the host's one-shot events.
+#include <climits>
 #include <cstring>
 
 #include "RecordedScene.h"
@@ -7,6 +8,10 @@
 using namespace apptest;
 using vi::Application;
 using vi::ApplicationVar;
+
+// The host's entry point, called as the JVM would (it reads neither argument).
+extern "C" int Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(void* env, void* thiz,
+                                                                                        int orientation);
 
 namespace {
 
@@ -74,6 +79,27 @@ TEST_F(Lifecycle, SwitchToAnUninitialisedOrientationUnreadiesUntilInitialisedAnd
     Application::handleDraw();
     EXPECT_EQ(kindsOf(allEvents()), (std::vector<int>{TestSceneInitEffectAlternate, TestSceneDraw}));
     EXPECT_EQ(allEvents()[1].orientation, 0);
+}
+
+// The host may send any int: every value but 0 is the one alternate
+// orientation, initialised once; the scene keeps the value as sent. Under
+// ASan/UBSan a value used as an index is reported at once.
+TEST_F(Lifecycle, EveryNonZeroOrientationFromTheHostIsTheOneAlternateOrientation) {
+    startReadyScene();
+    testSceneSetDrawResult(5);
+    Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(nullptr, nullptr, 7);
+    EXPECT_EQ(Application::handleDraw(), 0) << "not yet initialised for the alternate orientation";
+    Application::handleInitEffect();
+    for (int value : {7, -1, 2, INT_MAX, INT_MIN, 1, 0, INT_MIN}) {
+        SCOPED_TRACE(value);
+        Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(nullptr, nullptr, value);
+        EXPECT_EQ(int(vi::gpScene->mOrientation), value);
+        EXPECT_EQ(Application::handleDraw(), 5);
+        Application::handleInitEffect();
+    }
+    EXPECT_EQ(testSceneCount(TestSceneInitEffectAlternate), 1);
+    EXPECT_EQ(testSceneCount(TestSceneInitEffect), 0);
+    EXPECT_EQ(testSceneCount(TestSceneDraw), 8);
 }
 
 TEST_F(Lifecycle, OneShotEventsReachOnlyAReadySceneAfterTheClock) {

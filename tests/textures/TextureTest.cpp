@@ -214,6 +214,14 @@ TEST_F(TextureTest, CubeUploadsItsSixFacesInOrderAsRgbaBytesAndSamplesThem) {
     EXPECT_EQ(probe.look(texture, -0.5f, -1.0f, 0.0f), cube.colours[3][0]);  // -Y: s from +x
     EXPECT_EQ(probe.look(texture, -0.5f, 0.0f, 1.0f), cube.colours[4][0]);   // +Z: s from +x
     EXPECT_EQ(probe.look(texture, 0.5f, 0.0f, -1.0f), cube.colours[5][0]);   // -Z: s from -x
+
+    // A plug-in animating a face points it at new pixels: the next upload reads them.
+    std::vector<std::uint8_t> red(16, 0);
+    for (std::size_t texel = 0; texel < 4; ++texel) red[texel * 4] = red[texel * 4 + 3] = 0xFF;
+    texture.mFaces[0] = red.data();
+    texture.update();
+    EXPECT_EQ(probe.look(texture, 1.0f, 0.0f, 0.5f), 0xFF0000FFu);
+    EXPECT_EQ(probe.look(texture, -1.0f, 0.0f, -0.5f), cube.colours[1][0]);
 }
 
 TEST_F(TextureTest, DestructionDeletesTheNameUnlessShared) {

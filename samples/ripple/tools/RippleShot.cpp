@@ -229,7 +229,7 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "ripple-shot: %s\n", dlerror());
         return 1;
     }
-    vi::gCreateScene = reinterpret_cast<CreateSceneFunction>(dlsym(library, "createScene"));
+    vi::gCreateScene = reinterpret_cast<vi::CreateSceneFunction>(dlsym(library, "createScene"));
     if (!vi::gCreateScene) return 1;
     vi::File::getAssetManager() = vi::DirectoryAssetManager::create(argv[2]);
     if (argc > 4 && std::string(argv[4]) == "photo") {
