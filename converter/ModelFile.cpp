@@ -55,7 +55,7 @@ std::string describeErrno() { return std::strerror(errno); }
 std::vector<std::uint8_t> ModelFile::encode(const MeshData& mesh) {
     const std::size_t vertexCount = mesh.positions.size();
     std::vector<std::uint8_t> out;
-    out.reserve(std::size_t(sizeFor(vertexCount, mesh.indices.size())));
+    out.reserve(std::size_t(ModelLayout::fileSize(vertexCount, mesh.indices.size())));
     putU32(out, std::uint32_t(vertexCount));
     putU32(out, std::uint32_t(mesh.indices.size()));
     for (const glm::vec3& p : mesh.positions) {
@@ -79,13 +79,13 @@ std::vector<std::uint8_t> ModelFile::encode(const MeshData& mesh) {
 bool ModelFile::inspect(const std::vector<std::uint8_t>& bytes, Info& info, std::string& error) {
     info = Info();
     info.fileSize = bytes.size();
-    if (bytes.size() < kHeaderSize) {
+    if (bytes.size() < ModelLayout::kHeaderSize) {
         error = "the file has " + std::to_string(bytes.size()) + " bytes, too short for the 8-byte header";
         return false;
     }
-    info.vertexCount = getU32(bytes.data());
-    info.indexCount = getU32(bytes.data() + 4);
-    info.expectedSize = sizeFor(info.vertexCount, info.indexCount);
+    info.vertexCount = getU32(bytes.data() + ModelLayout::kVertexCountOffset);
+    info.indexCount = getU32(bytes.data() + ModelLayout::kIndexCountOffset);
+    info.expectedSize = ModelLayout::fileSize(info.vertexCount, info.indexCount);
     const std::string counts =
         "V = " + std::to_string(info.vertexCount) + " and I = " + std::to_string(info.indexCount);
     if (info.fileSize < info.expectedSize) {
@@ -107,7 +107,7 @@ bool ModelFile::inspect(const std::vector<std::uint8_t>& bytes, Info& info, std:
                 " must be a multiple of 3";
         return false;
     }
-    const std::uint8_t* indices = bytes.data() + indicesOffset(info.vertexCount);
+    const std::uint8_t* indices = bytes.data() + ModelLayout::indicesOffset(info.vertexCount);
     for (std::uint32_t i = 0; i < info.indexCount; ++i) {
         std::uint16_t index = getU16(indices + 2 * i);
         if (index >= info.vertexCount) {
@@ -119,7 +119,7 @@ bool ModelFile::inspect(const std::vector<std::uint8_t>& bytes, Info& info, std:
     if (info.vertexCount > 0) {
         info.boundsMin = glm::vec3(std::numeric_limits<float>::max());
         info.boundsMax = glm::vec3(-std::numeric_limits<float>::max());
-        const std::uint8_t* positions = bytes.data() + kHeaderSize;
+        const std::uint8_t* positions = bytes.data() + ModelLayout::positionsOffset(info.vertexCount);
         for (std::uint32_t v = 0; v < info.vertexCount; ++v) {
             glm::vec3 p(getFloat(positions + 12 * v), getFloat(positions + 12 * v + 4),
                         getFloat(positions + 12 * v + 8));

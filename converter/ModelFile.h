@@ -1,9 +1,6 @@
 #pragma once
 
-// The model file the runtime reads in place: little-endian, no header beyond
-// the two counts, no padding.
-//   u32 V, u32 I, V x 3 float positions, V x 3 float normals,
-//   V x 2 float texture coordinates, I x u16 indices.
+// The model file the runtime reads in place (its layout: Render/ModelLayout.h).
 // encode() and inspect() are exact inverses for well-formed files; inspect()
 // also finds what the runtime would not: a size that does not match the
 // counts, an index count that is not a multiple of three, an index past V.
@@ -15,6 +12,7 @@
 #include <glm/glm.hpp>
 
 #include "MeshData.h"
+#include "Render/ModelLayout.h"
 
 namespace vi {
 
@@ -30,16 +28,6 @@ public:
         // Triangles the runtime draws: I / 3, or V / 3 for a file without indices.
         std::uint32_t triangleCount() const { return indexCount != 0 ? indexCount / 3 : vertexCount / 3; }
     };
-
-    static constexpr std::uint64_t kHeaderSize = 8;
-
-    // Offsets of the arrays for V vertices, as the runtime computes them.
-    static std::uint64_t normalsOffset(std::uint64_t vertexCount) { return kHeaderSize + 12 * vertexCount; }
-    static std::uint64_t texCoordsOffset(std::uint64_t vertexCount) { return kHeaderSize + 24 * vertexCount; }
-    static std::uint64_t indicesOffset(std::uint64_t vertexCount) { return kHeaderSize + 32 * vertexCount; }
-    static std::uint64_t sizeFor(std::uint64_t vertexCount, std::uint64_t indexCount) {
-        return indicesOffset(vertexCount) + 2 * indexCount;
-    }
 
     // The file's bytes. The mesh must already fit 16-bit indices.
     static std::vector<std::uint8_t> encode(const MeshData& mesh);

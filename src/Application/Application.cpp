@@ -1,12 +1,11 @@
 #include "Application/Application.h"
 
-#include <pthread.h>
-
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
 
 #include "Application/AnimationManager.h"
+#include "Application/ApplicationLock.h"
 #include "Application/ApplicationVar.h"
 #include "Application/ContextRecovery.h"
 #include "Application/Timer.h"
@@ -16,8 +15,15 @@ namespace vi {
 
 namespace {
 
-void lock() { pthread_mutex_lock(&ApplicationVar::msCriticalSection); }
-void unlock() { pthread_mutex_unlock(&ApplicationVar::msCriticalSection); }
+// Every handler that acts only on a ready scene has this shape: the lock for
+// the whole run, the ready test, then `action` on the scene. Its result, or a
+// default one (0 for a frame) when the scene is not ready.
+template <typename Action>
+auto withReadyScene(Action action) -> decltype(action(*gpScene)) {
+    ApplicationLock lock;
+    if (!Application::isReady()) return decltype(action(*gpScene))();
+    return action(*gpScene);
+}
 
 // A width or height below 1 becomes 1, so that normalising a touch never
 // divides by zero.
@@ -28,6 +34,32 @@ void storeWindowRectangle(int left, int top, int width, int height) {
     ApplicationVar::msWindowHeight = height < 1 ? 1 : height;
 }
 
+// The entry of mInitialised for the scene's current orientation: any value
+// the host sent maps to one of the two entries, never past them.
+bool& initialisedForCurrentOrientation(Scene& scene) {
+    return scene.mInitialised[Orientation::initialisedIndex(scene.mOrientation)];
+}
+
+// A start up to the new scene; callers hold the lock.
+void startScene(int left, int top, int width, int height) {
+    storeWindowRectangle(left, top, width, height);
+    Timer::restart();
+    ContextRecovery::invalidateIfLost();
+    // Not cleared after the delete: the factory's result overwrites it at once.
+    if (gpScene) delete gpScene;
+    int size[2] = {ApplicationVar::msWindowWidth, ApplicationVar::msWindowHeight};
+    gpScene = gCreateScene(size, &ApplicationVar::msModelsMap, &ApplicationVar::msTexturesMap);
+}
+
+// handleStop and destroyScene are one operation. Only invalidates GL names:
+// the next ready frame re-creates them in whatever context is current then.
+void stopScene() {
+    ApplicationLock lock;
+    ContextRecovery::invalidateIfLost();
+    if (gpScene) delete gpScene;
+    gpScene = nullptr;
+}
+
 // The count is taken once: an animation added by an update waits for the next
 // frame. The clock is read afresh for each call, since an update may move it.
 void updateAnimations() {
@@ -35,20 +67,11 @@ void updateAnimations() {
     for (std::size_t i = 0; i < count; ++i) AnimationManager::mStorage[i]->update(AnimationManager::mNow);
 }
 
-// handleStop and destroyScene are one operation. Only invalidates GL names:
-// the next ready frame re-creates them in whatever context is current then.
-void stopScene() {
-    lock();
-    ContextRecovery::invalidateIfLost();
-    if (gpScene) delete gpScene;
-    gpScene = nullptr;
-    unlock();
-}
-
-// The entry of mInitialised for the scene's current orientation: any value
-// the host sent maps to one of the two entries, never past them.
-bool& initialisedForCurrentOrientation(Scene& scene) {
-    return scene.mInitialised[Orientation::initialisedIndex(scene.mOrientation)];
+void deliverTouch(int x, int y, void (Scene::*operation)(const glm::vec2&)) {
+    withReadyScene([&](Scene& scene) {
+        Timer::update();
+        (scene.*operation)(Application::mouseNormalize(x, y));
+    });
 }
 
 }  // namespace
@@ -63,31 +86,14 @@ glm::vec2 Application::mouseNormalize(int x, int y) {
 
 // --- Lifecycle ---------------------------------------------------------------
 
-namespace {
-
-// Steps 2 to 6 of a start; callers hold the lock.
-void startScene(int left, int top, int width, int height) {
-    storeWindowRectangle(left, top, width, height);
-    Timer::restart();
-    ContextRecovery::invalidateIfLost();
-    // Not cleared after the delete: the factory's result overwrites it at once.
-    if (gpScene) delete gpScene;
-    int size[2] = {ApplicationVar::msWindowWidth, ApplicationVar::msWindowHeight};
-    gpScene = gCreateScene(size, &ApplicationVar::msModelsMap, &ApplicationVar::msTexturesMap);
-}
-
-}  // namespace
-
 std::vector<std::string>& Application::handleStart(int left, int top, int width, int height) {
-    lock();
+    ApplicationLock lock;
     startScene(left, top, width, height);
-    std::vector<std::string>& names = gpScene->mNames;
-    unlock();
-    return names;
+    return gpScene->mNames;
 }
 
 void Application::handleStart(int left, int top, int width, int height, std::vector<std::string>& namesCopy) {
-    lock();
+    ApplicationLock lock;
     startScene(left, top, width, height);
     // A count no vector can hold cannot be copied: the host gets no answer.
     if (gpScene->mNames.size() > namesCopy.max_size()) {
@@ -95,24 +101,26 @@ void Application::handleStart(int left, int top, int width, int height, std::vec
         std::abort();
     }
     namesCopy = gpScene->mNames;
-    unlock();
 }
 
+// The context is not checked here, deliberately (start, stop, draw and the
+// host's image loading check it): right after a context change, objects that
+// outlive a scene (shared programs, host images, the scene's own renderers
+// after a restart) still hold names of the old context, and an initialisation
+// that binds them binds stale names. The next ready frame notices the change
+// and rebuilds every object, including what the initialisation made.
 void Application::handleInitEffect() {
-    lock();
-    if (gpScene) {
-        // Restarted also when the scene is already initialised.
-        Timer::restart();
-        bool& initialised = initialisedForCurrentOrientation(*gpScene);
-        if (!initialised) {
-            if (gpScene->mOrientation == Orientation::Initial)
-                gpScene->initEffect();
-            else
-                gpScene->initEffectAlternate();
-            initialised = true;
-        }
-    }
-    unlock();
+    ApplicationLock lock;
+    if (!gpScene) return;
+    // Restarted also when the scene is already initialised.
+    Timer::restart();
+    bool& initialised = initialisedForCurrentOrientation(*gpScene);
+    if (initialised) return;
+    if (gpScene->mOrientation == Orientation::Initial)
+        gpScene->initEffect();
+    else
+        gpScene->initEffectAlternate();
+    initialised = true;
 }
 
 // No lock and no word to the scene, on purpose: the host sets the rectangle
@@ -135,107 +143,69 @@ void Application::destroyScene() { stopScene(); }
 
 // --- One-shot events ---------------------------------------------------------
 
+// The clock restarts after the scene cleared, and is not advanced before.
 void Application::handleClearEffect() {
-    lock();
-    if (isReady()) {
-        gpScene->clearEffect();
+    withReadyScene([](Scene& scene) {
+        scene.clearEffect();
         Timer::restart();
-    }
-    unlock();
+    });
 }
 
 // Needs a scene but not a ready one. The aspect comes from the scene's own
 // size, never from the window. No initialisation here: a scene switched to an
 // orientation it was never initialised for waits for handleInitEffect.
 void Application::handleSetOrientation(Orientation::OrientationEnum orientation) {
-    lock();
-    if (gpScene) {
-        Timer::update();
-        if (orientation != gpScene->mOrientation) {
-            gpScene->mAspect = gpScene->mSize.x / gpScene->mSize.y;
-            gpScene->mOrientation = orientation;
-            if (gpScene->mAspect < 1.0f)
-                gpScene->mScale = glm::vec2(1.0f, gpScene->mSize.y / gpScene->mSize.x);
-            else
-                gpScene->mScale = glm::vec2(gpScene->mAspect, 1.0f);
-        }
-    }
-    unlock();
+    ApplicationLock lock;
+    if (!gpScene) return;
+    Timer::update();
+    if (orientation == gpScene->mOrientation) return;
+    gpScene->mAspect = gpScene->mSize.x / gpScene->mSize.y;
+    gpScene->mOrientation = orientation;
+    if (gpScene->mAspect < 1.0f)
+        gpScene->mScale = glm::vec2(1.0f, gpScene->mSize.y / gpScene->mSize.x);
+    else
+        gpScene->mScale = glm::vec2(gpScene->mAspect, 1.0f);
 }
 
 void Application::handleAffordance() {
-    lock();
-    if (isReady()) {
+    withReadyScene([](Scene& scene) {
         Timer::update();
-        gpScene->clearEffect();
-        gpScene->affordance();
-    }
-    unlock();
+        scene.clearEffect();
+        scene.affordance();
+    });
 }
 
 void Application::handleUnlock() {
-    lock();
-    if (isReady()) {
+    withReadyScene([](Scene& scene) {
         Timer::update();
-        gpScene->unlock();
-    }
-    unlock();
+        scene.unlock();
+    });
 }
 
 void Application::handleParam(int a, int b) {
-    lock();
-    if (isReady()) {
+    withReadyScene([&](Scene& scene) {
         Timer::update();
-        gpScene->param(a, b);
-    }
-    unlock();
+        scene.param(a, b);
+    });
 }
 
 // --- Frames and touches ------------------------------------------------------
 
+// Not ready: 0, and neither the context nor the clock is touched.
 int Application::handleDraw() {
-    lock();
-    if (!isReady()) {
-        unlock();
-        return 0;
-    }
-    ContextRecovery::recoverIfLost();
-    Timer::update();
-    updateAnimations();
-    const int result = gpScene->draw();
-    unlock();
-    return result;
+    return withReadyScene([](Scene& scene) {
+        ContextRecovery::recoverIfLost();
+        Timer::update();
+        updateAnimations();
+        return scene.draw();
+    });
 }
 
-void Application::handleMouseDown(int x, int y) {
-    lock();
-    if (isReady()) {
-        Timer::update();
-        const glm::vec2 position = mouseNormalize(x, y);
-        gpScene->touchDown(position);
-    }
-    unlock();
-}
+void Application::handleMouseDown(int x, int y) { deliverTouch(x, y, &Scene::touchDown); }
 
-void Application::handleMouseUp(int x, int y) {
-    lock();
-    if (isReady()) {
-        Timer::update();
-        const glm::vec2 position = mouseNormalize(x, y);
-        gpScene->touchUp(position);
-    }
-    unlock();
-}
+void Application::handleMouseUp(int x, int y) { deliverTouch(x, y, &Scene::touchUp); }
 
-void Application::handleMouseMove(int x, int y) {
-    lock();
-    if (isReady()) {
-        Timer::update();
-        const glm::vec2 position = mouseNormalize(x, y);
-        gpScene->touchMove(position);
-    }
-    unlock();
-}
+void Application::handleMouseMove(int x, int y) { deliverTouch(x, y, &Scene::touchMove); }
 
 // --- Texture recycling -------------------------------------------------------
 

@@ -1,11 +1,10 @@
 // Key handling: the host's three keys go to the scene unchanged; four letter
 // codes, which no host entry produces, are developer keys for driving the
 // runtime by hand, kept exactly as they are (including the one that blocks).
-#include <pthread.h>
-#include <stdlib.h>
-
 #include "Application/Application.h"
+#include "Application/ApplicationLock.h"
 #include "Application/ApplicationVar.h"
+#include "Application/SelfTest.h"
 #include "Application/Timer.h"
 
 namespace vi {
@@ -17,131 +16,19 @@ const unsigned int kClearEffectKey = 'C';  // 67
 const unsigned int kUnlockKey = 'U';       // 85
 const unsigned int kAffordanceKey = 'A';   // 65
 
-// --- The randomised self-test ------------------------------------------------
-// Hammers the handlers exactly as the host would, each taking the lock for
-// itself. The number of random draws never depends on the scene's state: a
-// handler that finds no ready scene does nothing, and the loops go on.
-
-enum class TouchKind { Down, Move, Up };
-
-unsigned int drawCount() { return static_cast<unsigned int>(lrand48() % 100); }
-
-void frame() { Application::handleDraw(); }
-
-// rx and ry are both drawn, in this order, whatever the scene's state.
-void touch(TouchKind kind) {
-    const long rx = lrand48();
-    const long ry = lrand48();
-    const int x = ApplicationVar::msWindowLeft + int(rx % ApplicationVar::msWindowWidth);
-    const int y = ApplicationVar::msWindowTop + int(ry % ApplicationVar::msWindowHeight);
-    switch (kind) {
-    case TouchKind::Down:
-        Application::handleMouseDown(x, y);
-        break;
-    case TouchKind::Move:
-        Application::handleMouseMove(x, y);
-        break;
-    case TouchKind::Up:
-        Application::handleMouseUp(x, y);
-        break;
-    }
-    frame();
-}
-
-void restartWithCurrentWindow() {
-    Application::handleStart(ApplicationVar::msWindowLeft, ApplicationVar::msWindowTop, ApplicationVar::msWindowWidth,
-                             ApplicationVar::msWindowHeight);
-}
-
-// Fresh scenes, switched to the orientations 0, 1, 0, 1, ... in turn.
-void orientationRestarts() {
-    const unsigned int n = drawCount();
-    for (unsigned int i = 0; i < n; ++i) {
-        restartWithCurrentWindow();
-        Application::handleInitEffect();
-        Application::handleSetOrientation(static_cast<Orientation::OrientationEnum>(i & 1));
-        Application::handleInitEffect();
-        frame();
-    }
-}
-
-// The moves advance the phase's own counter, not one of their own: once it has
-// reached a gesture's move count, later gestures make no moves until a fresh
-// count lies above it again. Kept so on purpose.
-void gesturesSharingOneCounter() {
-    const unsigned int n = drawCount();
-    unsigned int i = 0;
-    while (i < n) {
-        touch(TouchKind::Down);
-        const unsigned int m = drawCount();
-        while (i < m) {
-            touch(TouchKind::Move);
-            ++i;
-        }
-        touch(TouchKind::Up);
-        ++i;
-    }
-}
-
-void gesturesWithSeparateCounters() {
-    const unsigned int n = drawCount();
-    for (unsigned int gesture = 0; gesture < n; ++gesture) {
-        touch(TouchKind::Down);
-        const unsigned int m = drawCount();
-        for (unsigned int move = 0; move < m; ++move) touch(TouchKind::Move);
-        touch(TouchKind::Up);
-    }
-}
-
-// Writes the window globals directly, without the lock and without
-// handleWindowRectangle, on purpose; the last rectangle stays in force.
-void randomWindowRectangles() {
-    const unsigned int n = drawCount();
-    for (unsigned int pass = 0; pass < n; ++pass) {
-        restartWithCurrentWindow();
-        Application::handleInitEffect();
-        ApplicationVar::msWindowLeft = int(lrand48() % 1080);
-        ApplicationVar::msWindowTop = int(lrand48() % 1920);
-        ApplicationVar::msWindowWidth = int(lrand48() % 1080);
-        if (ApplicationVar::msWindowWidth < 1) ApplicationVar::msWindowWidth = 1;
-        ApplicationVar::msWindowHeight = int(lrand48() % 1920);
-        if (ApplicationVar::msWindowHeight < 1) ApplicationVar::msWindowHeight = 1;
-        Application::handleInitEffect();
-        frame();
-    }
-}
-
-void runSelfTest() {
-    orientationRestarts();
-    gesturesSharingOneCounter();
-    switch (lrand48() % 3) {
-    case 0:
-        orientationRestarts();
-        break;
-    case 1:
-        gesturesWithSeparateCounters();
-        break;
-    case 2:
-        randomWindowRectangles();
-        break;
-    }
-}
-
 }  // namespace
 
 void Application::handleKey(unsigned int key) {
-    pthread_mutex_lock(&ApplicationVar::msCriticalSection);
+    ApplicationLock lock;
     // No key, not even a developer key, acts before the scene is ready.
-    if (!isReady()) {
-        pthread_mutex_unlock(&ApplicationVar::msCriticalSection);
-        return;
-    }
+    if (!isReady()) return;
     Timer::update();
     if (key == kSelfTestKey) {
-        // The handlers the test calls take the lock for themselves.
-        pthread_mutex_unlock(&ApplicationVar::msCriticalSection);
-        runSelfTest();
-        pthread_mutex_lock(&ApplicationVar::msCriticalSection);
+        // The handlers the test calls take the lock for themselves; it is
+        // taken back before the guard releases it.
+        lock.unlock();
+        SelfTest::run();
+        lock.lock();
     } else if (key == kClearEffectKey) {
         // handleClearEffect takes the plain, non-recursive lock this thread
         // already holds: the thread blocks for good. Kept so deliberately.
@@ -154,7 +41,6 @@ void Application::handleKey(unsigned int key) {
     } else {
         gpScene->keyPressed(key);
     }
-    pthread_mutex_unlock(&ApplicationVar::msCriticalSection);
 }
 
 }  // namespace vi

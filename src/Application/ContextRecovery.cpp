@@ -1,18 +1,13 @@
 #include "Application/ContextRecovery.h"
 
-#include "Render/Attribute.h"
-#include "Render/Drawable.h"
 #include "Render/GL.h"
 #include "Render/Renderer.h"
 #include "Render/ShaderProgram.h"
 #include "Render/Texture.h"
-#include "Render/Uniform.h"
 
 namespace vi {
 
 namespace {
-
-constexpr GLuint kNoBuffer = 0xFFFFFFFF;
 
 // Only the first renderer's program and the first texture that has a GL name
 // are probed: the other objects were made in the same context and are assumed
@@ -39,49 +34,12 @@ bool isLostIn(EGLContext context) {
     return !programProbePasses() || !textureProbePasses();
 }
 
-// No GL call: every name belongs to a context that is gone (or not current).
+// Each owner forgets its own names; no GL call, since every name belongs to
+// a context that is gone (or not current). Renderers first, then textures.
 void invalidateFor(EGLContext context) {
     Renderer::mEglContext = context;
-    for (Renderer* renderer : Renderer::mAllRenderers) {
-        renderer->program->program = 0;
-        renderer->indexBuffer = kNoBuffer;
-        for (Attribute* attribute : renderer->attributes) attribute->buffer = kNoBuffer;
-    }
+    for (Renderer* renderer : Renderer::mAllRenderers) renderer->forgetGlObjects();
     for (Texture* texture : Texture::mAllTextures) texture->contextChanged();
-}
-
-void recreateIndexBuffer(Renderer& renderer) {
-    const Drawable& drawable = *renderer.drawable;
-    if (!drawable.indices) return;
-    glGenBuffers(1, &renderer.indexBuffer);
-    glBindBuffer(GL_ELEMENT_ARRAY_BUFFER, renderer.indexBuffer);
-    glBufferData(GL_ELEMENT_ARRAY_BUFFER, GLsizeiptr(drawable.elementCount) * sizeof(unsigned short),
-                 drawable.indices, GL_STATIC_DRAW);
-}
-
-// An attribute the relinked program no longer has keeps location -1 and no
-// buffer; the renderer then draws without it. The vertex count is read through
-// the pointer now, so a count the drawable changed since is honoured.
-void recreateAttribute(GLuint program, Attribute& attribute) {
-    attribute.location = glGetAttribLocation(program, attribute.name.c_str());
-    if (attribute.location == -1) return;
-    glGenBuffers(1, &attribute.buffer);
-    glBindBuffer(GL_ARRAY_BUFFER, attribute.buffer);
-    glBufferData(GL_ARRAY_BUFFER, GLsizeiptr(*attribute.vertexCount) * attribute.components * sizeof(float),
-                 attribute.data, attribute.isStatic ? GL_STATIC_DRAW : GL_STREAM_DRAW);
-    glEnableVertexAttribArray(GLuint(attribute.location));
-    glVertexAttribPointer(GLuint(attribute.location), GLint(attribute.components), GL_FLOAT, GL_FALSE, 0, nullptr);
-}
-
-// Renderers often share a program: init() on one already rebuilt for an
-// earlier renderer finds its name valid and returns at once.
-void recreateRenderer(Renderer& renderer) {
-    renderer.program->init();
-    const GLuint program = renderer.program->program;
-    recreateIndexBuffer(renderer);
-    for (Attribute* attribute : renderer.attributes) recreateAttribute(program, *attribute);
-    for (Uniform* uniform : renderer.uniforms)
-        uniform->location = glGetUniformLocation(program, uniform->name.c_str());
 }
 
 }  // namespace
@@ -94,7 +52,7 @@ void ContextRecovery::recreate() {
     // Without a current context nothing can be made; the next frame in a real
     // context finds the mismatch and comes back here.
     if (Renderer::mEglContext == EGL_NO_CONTEXT) return;
-    for (Renderer* renderer : Renderer::mAllRenderers) recreateRenderer(*renderer);
+    for (Renderer* renderer : Renderer::mAllRenderers) renderer->recreateGlObjects();
     for (Texture* texture : Texture::mAllTextures) texture->allocate();
 }
 

@@ -8,8 +8,6 @@
 #include <cstdlib>
 #include <string>
 
-#include <glm/glm.hpp>
-
 #include "Application/ApplicationVar.h"
 #include "Application/ContextRecovery.h"
 #include "Application/Scene.h"
@@ -21,32 +19,28 @@ namespace {
 // A host image as a texture: uploaded once, plain repeat, linear, RGBA bytes.
 // No GL work: the context recovery or the scene allocates it before first use.
 void fileNewTexture(const std::string& name, void* buffer, unsigned int width, unsigned int height) {
-    vi::ApplicationVar::msTexturesMap[name] = new vi::Texture(buffer, width, height, true, true, false, true,
-                                                              false, 4, false);
+    const bool kUploadOnce = true;
+    const bool kRepeat = true;
+    const bool kNotMirrored = false;
+    const bool kLinear = true;
+    const bool kNotCompressed = false;
+    const unsigned int kRgba = 4;
+    const bool kBytes = false;
+    vi::ApplicationVar::msTexturesMap[name] = new vi::Texture(buffer, width, height, kUploadOnce, kRepeat,
+                                                              kNotMirrored, kLinear, kNotCompressed, kRgba, kBytes);
     vi::ApplicationVar::msTexturesMap[name]->setDeletable(true);
 }
 
-// Keeps the texture object, its GL name and its registry entry, so that
-// renderers bound to it draw the new pixels. The deletable flag stays as it was.
-void replacePixels(vi::Texture& texture, void* buffer, unsigned int width, unsigned int height) {
-    if (texture.mIsDeletable) std::free(texture.mBuffer);
-    texture.mBuffer = buffer;
-    texture.mWidth = width;
-    texture.mHeight = height;
-    // Cleared so that the upload below defines the GL storage at the new size.
-    texture.mIsUploaded = false;
-    texture.mSize = glm::vec2(float(width), float(height));
-    texture.mTexelSize = glm::vec2(1.0f / float(width), 1.0f / float(height));
-    texture.update();
-    // A texture not yet allocated has no GL name: the upload above went to the
-    // default texture and defined nothing of its own. Its first allocate() must
-    // then define the storage in full, not re-upload into storage it lacks.
-    if (texture.mId == 0) texture.mIsUploaded = false;
+// The deletable flag stays as it was; only this path tells the scene.
+void replaceAndTellTheScene(vi::Texture& texture, void* buffer, unsigned int width, unsigned int height) {
+    texture.replacePixels(buffer, width, height);
     if (vi::gpScene) vi::gpScene->textureUpdated();
 }
 
 // The entry is neither erased nor reset: it keeps the pointer to the deleted
-// texture, on purpose. The host unloads a name only when it will load it no more.
+// texture, on purpose. A later load of the same name would take that stale
+// pointer for a filed texture and replace the pixels of freed memory, so the
+// host unloads a name only when it will load it no more.
 void unload(const std::string& name) {
     vi::Texture* texture = vi::ApplicationVar::msTexturesMap[name];
     if (texture) delete texture;
@@ -77,7 +71,7 @@ extern "C" JNIEXPORT void JNICALL Java_com_tarq_android_visualeffect_common_Nati
         if (!filed)
             fileNewTexture(key, buffer, w, h);
         else
-            replacePixels(*filed, buffer, w, h);
+            replaceAndTellTheScene(*filed, buffer, w, h);
         env->ReleaseIntArrayElements(pixels, elements, 0);
     }
 

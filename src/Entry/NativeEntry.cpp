@@ -34,6 +34,10 @@ extern "C" {
 JNIEXPORT jobjectArray JNICALL VI_NATIVE(prehandleStart)(JNIEnv* env, jobject, jstring libraryPath, jint width,
                                                          jint height) {
     vi::Application::handleStop();
+    // Cleared before the open, so that a host asking dlerror() after a null
+    // result reads this start's failure. The flip side, kept: a successful
+    // start with a path already open leaves nothing there, and any error an
+    // earlier call left behind is gone.
     dlerror();
     const char* path = env->GetStringUTFChars(libraryPath, nullptr);
     // On failure the UTF chars are deliberately not released; no scene is made.

@@ -14,7 +14,7 @@ namespace vi {
 class VI_EXPORT Attribute {
 public:
     std::string name;
-    GLuint buffer;  // 0xFFFFFFFF while none
+    GLuint buffer;  // kNoBuffer (Render/NamedValues.h) while none
     GLint location;
     const void* data;
     const unsigned int* vertexCount;

@@ -69,10 +69,17 @@ void Curves::calculateCatmullRomPoints(const glm::vec2* red, int redCount, const
         }
     }
 
-    // Dynamic, so that the table is uploaded at every bind and later edits
-    // show; not deletable, the table is this object's own. An earlier texture
-    // is not deleted here.
-    mTexture = new Texture(mTable, 1, 256, false, true, false, true, false, 4, false);
+    // One texel wide, one row per input level. Dynamic, so that the table is
+    // uploaded at every bind and later edits show; not deletable, the table is
+    // this object's own. An earlier texture is not deleted here.
+    const bool kEveryBind = false;
+    const bool kRepeat = true;
+    const bool kNotMirrored = false;
+    const bool kLinear = true;
+    const bool kNotCompressed = false;
+    const unsigned int kRgba = 4;
+    const bool kBytes = false;
+    mTexture = new Texture(mTable, 1, 256, kEveryBind, kRepeat, kNotMirrored, kLinear, kNotCompressed, kRgba, kBytes);
 }
 
 void Curves::calculateCatmullRomPoint(int start, int end, glm::vec2 p0, glm::vec2 p1, glm::vec2 p2, glm::vec2 p3,

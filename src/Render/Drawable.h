@@ -18,6 +18,11 @@ public:
     // Every field zero, except the model matrix (identity) and opacity (1).
     Drawable();
 
+    // The normal, model-view and model-view-projection matrices from the model
+    // matrix and the shared view and projection; what a renderer does before
+    // each draw.
+    void deriveMatrices();
+
     unsigned int mode;
     Texture* texture;
     unsigned int userWords[3];  // zero in every drawable the framework fills; free for effects

@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include "Render/GL.h"
+#include "Render/ModelLayout.h"
 
 namespace vi {
 
@@ -17,13 +18,10 @@ static_assert(__STDCPP_DEFAULT_NEW_ALIGNMENT__ >= alignof(float), "model buffers
 
 namespace {
 
-const unsigned int kHeaderSize = 8;
-
-// The header's two little-endian words, read without assuming anything of the
-// buffer beyond its bytes.
-unsigned int headerWord(const char* buffer, unsigned int index) {
+// A header count, read without assuming anything of the buffer beyond its bytes.
+unsigned int headerWord(const char* buffer, std::uint64_t offset) {
     std::uint32_t word;
-    std::memcpy(&word, buffer + 4 * index, sizeof(word));
+    std::memcpy(&word, buffer + offset, sizeof(word));
     return word;
 }
 
@@ -39,15 +37,15 @@ bool ModelObject::fillDrawable(Drawable& drawable) {
     const char* buffer = getBuffer();
     assert(reinterpret_cast<std::uintptr_t>(buffer) % alignof(float) == 0);
     // The counts are trusted: a file shorter than they say is read past its end.
-    unsigned int vertexCount = headerWord(buffer, 0);
-    unsigned int indexCount = headerWord(buffer, 1);
+    unsigned int vertexCount = headerWord(buffer, ModelLayout::kVertexCountOffset);
+    unsigned int indexCount = headerWord(buffer, ModelLayout::kIndexCountOffset);
 
     drawable.vertexCount = vertexCount;
-    drawable.positions = reinterpret_cast<const float*>(buffer + kHeaderSize);
-    drawable.normals = reinterpret_cast<const float*>(buffer + kHeaderSize + 12 * vertexCount);
-    drawable.texCoords = reinterpret_cast<const float*>(buffer + kHeaderSize + 24 * vertexCount);
+    drawable.positions = reinterpret_cast<const float*>(buffer + ModelLayout::positionsOffset(vertexCount));
+    drawable.normals = reinterpret_cast<const float*>(buffer + ModelLayout::normalsOffset(vertexCount));
+    drawable.texCoords = reinterpret_cast<const float*>(buffer + ModelLayout::texCoordsOffset(vertexCount));
     if (indexCount != 0) {
-        drawable.indices = reinterpret_cast<const unsigned short*>(buffer + kHeaderSize + 32 * vertexCount);
+        drawable.indices = reinterpret_cast<const unsigned short*>(buffer + ModelLayout::indicesOffset(vertexCount));
         drawable.elementCount = indexCount;
     } else {
         // No index array: the vertices are drawn as a plain triangle list.
@@ -64,10 +62,10 @@ bool ModelObject::fillDrawable(Drawable& drawable) {
 }
 
 void ModelObject::scale(float factor) {
-    if (mData.size() < kHeaderSize) return;
+    if (mData.size() < ModelLayout::kHeaderSize) return;
     char* buffer = getBuffer();
-    unsigned int vertexCount = headerWord(buffer, 0);
-    float* positions = reinterpret_cast<float*>(buffer + kHeaderSize);
+    unsigned int vertexCount = headerWord(buffer, ModelLayout::kVertexCountOffset);
+    float* positions = reinterpret_cast<float*>(buffer + ModelLayout::positionsOffset(vertexCount));
     for (unsigned int i = 0; i < 3 * vertexCount; ++i) positions[i] *= factor;
 }
 

@@ -1,6 +1,8 @@
 #include "Render/RenderableTexture.h"
 
 #include "Render/Drawable.h"
+#include "Render/NamedValues.h"
+#include "Render/RenderTargetFrame.h"
 #include "Render/Renderer.h"
 
 namespace vi {
@@ -11,7 +13,10 @@ glm::ivec2 RenderableTexture::mCurrentFrameBufferSize(0, 0);
 
 namespace {
 
-constexpr unsigned int kRenderTargetKind = 1;
+// A target's colour is its texture: RGBA bytes, never compressed.
+constexpr bool kNotCompressed = false;
+constexpr unsigned int kRgba = 4;
+constexpr bool kBytes = false;
 
 // The framebuffer and viewport the framework last bound, as the statics hold them.
 struct Binding {
@@ -51,7 +56,7 @@ RenderableTexture::RenderableTexture(std::vector<Renderer*>& renderers, unsigned
 
 RenderableTexture::RenderableTexture(unsigned int x, unsigned int y, unsigned int width, unsigned int height,
                                      bool isStatic, bool isRepeat, bool isMirrored, bool isLinear, bool hasDepth)
-    : Texture(nullptr, width, height, isStatic, isRepeat, isMirrored, isLinear, false, 4, false),
+    : Texture(nullptr, width, height, isStatic, isRepeat, isMirrored, isLinear, kNotCompressed, kRgba, kBytes),
       mTargetViewMatrix(1.0f),
       mTargetProjectionMatrix(1.0f),
       mPosition{x, y},
@@ -61,7 +66,7 @@ RenderableTexture::RenderableTexture(unsigned int x, unsigned int y, unsigned in
       mHasDepth(hasDepth),
       mRenderers(nullptr),
       mAnchor{0, 0, 0, 0, 0} {
-    mKind = kRenderTargetKind;
+    mKind = kRenderTargetTexture;
 }
 
 RenderableTexture::~RenderableTexture() {
@@ -203,19 +208,27 @@ void RenderableTexture::writeBuffer(const unsigned char* pixels) {
     glTexSubImage2D(GL_TEXTURE_2D, 0, 0, 0, mWidth, mHeight, GL_RGBA, GL_UNSIGNED_BYTE, pixels);
 }
 
+// One save slot per target, kept so on purpose: enabling twice without a
+// disable in between saves this target's own binding over the one before, and
+// a clear() or renderFrame(renderer, ...) inside an anchor (both anchor
+// themselves) does the same, so the outer binding is lost. Unlike the nesting
+// renderFrame(), an anchor does not nest.
 void RenderableTexture::enableAnchor() {
-    mAnchor[0] = int(mCurrentFrameBuffer);
-    mAnchor[1] = mCurrentFrameBufferPosition.x;
-    mAnchor[2] = mCurrentFrameBufferPosition.y;
-    mAnchor[3] = mCurrentFrameBufferSize.x;
-    mAnchor[4] = mCurrentFrameBufferSize.y;
+    mAnchor[kAnchorFrameBuffer] = int(mCurrentFrameBuffer);
+    mAnchor[kAnchorX] = mCurrentFrameBufferPosition.x;
+    mAnchor[kAnchorY] = mCurrentFrameBufferPosition.y;
+    mAnchor[kAnchorWidth] = mCurrentFrameBufferSize.x;
+    mAnchor[kAnchorHeight] = mCurrentFrameBufferSize.y;
     applyBinding(targetBinding(*this));
 }
 
 void RenderableTexture::disableAnchor() {
-    applyBinding(Binding{GLuint(mAnchor[0]), glm::ivec2(mAnchor[1], mAnchor[2]), glm::ivec2(mAnchor[3], mAnchor[4])});
+    applyBinding(Binding{GLuint(mAnchor[kAnchorFrameBuffer]), glm::ivec2(mAnchor[kAnchorX], mAnchor[kAnchorY]),
+                         glm::ivec2(mAnchor[kAnchorWidth], mAnchor[kAnchorHeight])});
 }
 
 glm::ivec2& RenderableTexture::getViewportSize() { return mCurrentFrameBufferSize; }
+
+void renderTargetFrame(Texture& target) { static_cast<RenderableTexture&>(target).renderFrame(); }
 
 }  // namespace vi

@@ -13,6 +13,7 @@
 #include <glm/glm.hpp>
 
 #include "Render/GL.h"
+#include "Render/NamedValues.h"
 #include "Render/Texture.h"
 #include "Tools/Export.h"
 
@@ -49,7 +50,7 @@ public:
     GLuint mDepthBuffer;
     bool mHasDepth;
     std::vector<Renderer*>* mRenderers;
-    int mAnchor[5];  // framebuffer, x, y, width, height
+    int mAnchor[kAnchorSlotCount];  // the binding enableAnchor() saved, by AnchorSlot
 
     static GLuint mCurrentFrameBuffer;
     static glm::ivec2 mCurrentFrameBufferPosition;

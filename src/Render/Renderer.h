@@ -39,6 +39,13 @@ public:
     // and draws. Not virtual.
     void render();
 
+    // A lost context, in two steps run over every renderer in registry order:
+    // forget every GL name, then (once a context is current) rebuild the
+    // program, buffers and locations exactly as construction and the add
+    // operations made them.
+    void forgetGlObjects();
+    void recreateGlObjects();
+
     // Fixed-function state of the current context; they touch no renderer.
     static void setCullFace(bool enable, bool back);
     static void setDepthTest(bool enable, bool less, bool equal);
@@ -49,7 +56,7 @@ public:
     static void setSprite(bool enable);
 
     ShaderProgram* program;
-    GLuint indexBuffer;  // 0xFFFFFFFF: none
+    GLuint indexBuffer;  // kNoBuffer (Render/NamedValues.h): none
     std::vector<Attribute*> attributes;
     std::vector<Uniform*> uniforms;
     std::vector<std::pair<Texture*, GLint>> textures;  // index = texture unit

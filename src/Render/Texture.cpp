@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <cstdlib>
 
+#include "Render/NamedValues.h"
+
 namespace vi {
 
 std::vector<Texture*> Texture::mAllTextures;
@@ -28,11 +30,21 @@ GLenum formatForChannels(unsigned int channels) {
     }
 }
 
+// Mali drivers mishandle repeated sub-image updates, so there every re-upload
+// respecifies the whole image. Decided once per process, the first time a
+// texture is allocated (the renderer string is known only with a context);
+// thread-safe one-time initialisation.
+bool driverAllowsSubImageUploads() {
+    static const bool isNotMali =
+        strncasecmp("Mali", reinterpret_cast<const char*>(glGetString(GL_RENDERER)), 4) != 0;
+    return isNotMali;
+}
+
 }  // namespace
 
 Texture::Texture(void* data, unsigned int width, unsigned int height, bool isStatic, bool isRepeat, bool isMirrored,
                  bool isLinear, bool isCompressed, unsigned int channels, bool isFloat)
-    : mKind(0),
+    : mKind(kPlainTexture),
       mId(0),
       mBuffer(data),
       mWidth(width),
@@ -70,8 +82,10 @@ void* Texture::getBuffer() { return mBuffer; }
 
 void Texture::update() {
     glBindTexture(mTarget, mId);
-    // The pack alignment, not the unpack one, on purpose: uploads run with the
-    // unpack alignment the context already has.
+    // The pack alignment, not the unpack one, kept so on purpose: uploads run
+    // with the unpack alignment the context already has (4 unless changed), so
+    // rows of RGB or alpha pixels whose length is not a multiple of 4 must be
+    // padded by whoever hands them in.
     glPixelStorei(GL_PACK_ALIGNMENT, 1);
     if (mIsCompressed) {
         // ETC1 is always specified in full; it never takes the sub-image path.
@@ -89,14 +103,10 @@ void Texture::update() {
 void Texture::allocate() {
     if (mId != 0 && glIsTexture(mId) == GL_TRUE) return;
 
-    // Mali drivers mishandle repeated sub-image updates, so there every
-    // re-upload respecifies the whole image. Probed once per process.
-    static const bool isNotMali =
-        strncasecmp("Mali", reinterpret_cast<const char*>(glGetString(GL_RENDERER)), 4) != 0;
-
+    const bool subImageUploads = driverAllowsSubImageUploads();
     const GLint filter = mIsLinear ? GL_LINEAR : GL_NEAREST;
     const GLint wrap = mIsRepeat ? (mIsMirrored ? GL_MIRRORED_REPEAT : GL_REPEAT) : GL_CLAMP_TO_EDGE;
-    mIsSubImageUse = isNotMali;
+    mIsSubImageUse = subImageUploads;
 
     glGenTextures(1, &mId);
     if (mIsStatic) {
@@ -128,5 +138,21 @@ void Texture::bind(unsigned int location, unsigned int unit) {
 }
 
 void Texture::setDeletable(bool isDeletable) { mIsDeletable = isDeletable; }
+
+void Texture::replacePixels(void* buffer, unsigned int width, unsigned int height) {
+    if (mIsDeletable) free(mBuffer);
+    mBuffer = buffer;
+    mWidth = width;
+    mHeight = height;
+    // Cleared so that the upload below defines the GL storage at the new size.
+    mIsUploaded = false;
+    mSize = glm::vec2(float(width), float(height));
+    mTexelSize = glm::vec2(1.0f / float(width), 1.0f / float(height));
+    update();
+    // A texture not yet allocated has no GL name: the upload above went to the
+    // default texture and defined nothing of its own. Its first allocate() must
+    // then define the storage in full, not re-upload into storage it lacks.
+    if (mId == 0) mIsUploaded = false;
+}
 
 }  // namespace vi

@@ -33,7 +33,13 @@ public:
 
     void setDeletable(bool isDeletable);
 
-    unsigned int mKind;  // 0 plain or cube, 1 render target
+    // New pixels of another size in place, uploaded at once (what the host's
+    // image loading does for a name already filed): the old buffer is freed
+    // when deletable, the new one is owned alike; the object, its GL name and
+    // its registry entry stay, so renderers bound to it draw the new pixels.
+    void replacePixels(void* buffer, unsigned int width, unsigned int height);
+
+    unsigned int mKind;  // a TextureKind (Render/NamedValues.h)
     GLuint mId;
     void* mBuffer;
     unsigned int mWidth;

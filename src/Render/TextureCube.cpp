@@ -14,6 +14,10 @@ constexpr GLenum kFaceTargets[kFaceCount] = {
     GL_TEXTURE_CUBE_MAP_NEGATIVE_Y, GL_TEXTURE_CUBE_MAP_POSITIVE_Z, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z,
 };
 
+// Faces are always RGBA bytes (or ETC1).
+constexpr unsigned int kRgba = 4;
+constexpr bool kBytes = false;
+
 }  // namespace
 
 // mBuffer stays null: every face, face 0 included, is read through mFaces, so
@@ -22,7 +26,7 @@ constexpr GLenum kFaceTargets[kFaceCount] = {
 // upload would read.
 TextureCube::TextureCube(void* const faces[6], const unsigned int widths[6], const unsigned int heights[6],
                          bool isStatic, bool isRepeat, bool isMirrored, bool isLinear, bool isCompressed)
-    : Texture(nullptr, widths[0], heights[0], isStatic, isRepeat, isMirrored, isLinear, isCompressed, 4, false),
+    : Texture(nullptr, widths[0], heights[0], isStatic, isRepeat, isMirrored, isLinear, isCompressed, kRgba, kBytes),
       mFaces(faces, faces + kFaceCount),
       mFaceWidths(widths, widths + kFaceCount),
       mFaceHeights(heights, heights + kFaceCount) {

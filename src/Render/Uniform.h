@@ -27,6 +27,10 @@ public:
         Float4 = 10,
     };
 
+    // Hands the value at `data` to the current program, by type; transpose is
+    // always GL_FALSE.
+    void upload() const;
+
     std::string name;
     GLint location;
     const void* data;
