@@ -4,7 +4,7 @@
 #include "Application/Application.h"
 #include "Application/ApplicationLock.h"
 #include "Application/ApplicationVar.h"
-#include "Application/SelfTest.h"
+#include "Application/SelfTestKey.h"
 #include "Application/Timer.h"
 
 namespace vi {
@@ -27,7 +27,7 @@ void Application::handleKey(unsigned int key) {
         // The handlers the test calls take the lock for themselves; it is
         // taken back before the guard releases it.
         lock.unlock();
-        SelfTest::run();
+        SelfTestKey::run();
         lock.lock();
     } else if (key == kClearEffectKey) {
         // handleClearEffect takes the plain, non-recursive lock this thread

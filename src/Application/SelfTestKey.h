@@ -9,7 +9,7 @@
 
 namespace vi {
 
-class VI_HIDDEN SelfTest {
+class VI_HIDDEN SelfTestKey {
 public:
     static void run();
 };

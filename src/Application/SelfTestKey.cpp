@@ -1,4 +1,4 @@
-#include "Application/SelfTest.h"
+#include "Application/SelfTestKey.h"
 
 #include <stdlib.h>
 
@@ -103,7 +103,7 @@ void randomWindowRectangles() {
 
 }  // namespace
 
-void SelfTest::run() {
+void SelfTestKey::run() {
     orientationRestarts();
     gesturesSharingOneCounter();
     switch (lrand48() % 3) {
