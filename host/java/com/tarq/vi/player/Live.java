@@ -144,7 +144,11 @@ public final class Live implements Session.Surface {
             }
             for (Timeline.Event typed = console.next(); typed != null; typed = console.next()) {
                 if (typed.kind().equals("end")) quit = true;
-                session.apply(typed, this, Path.of(""));
+                try {
+                    session.apply(typed, this, Path.of(""));
+                } catch (IOException e) {
+                    System.err.println("vi-live: stdin: " + e.getMessage());
+                }
             }
             if (watch.changedAndSettled(now)) reload();
             if (step) effectNanos += FRAME_NANOS;
@@ -209,11 +213,18 @@ public final class Live implements Session.Surface {
      * copy with the same window, orientation and images; a build that does
      * not load leaves the running effect.
      */
-    private void reload() throws IOException {
+    private void reload() {
         watch.markLoaded();
-        Path copy = watch.copy();
-        String reason = Desktop.whyNotLoadable(copy.toString());
-        if (reason == null && session.start(copy.toString(), true)) {
+        Path copy;
+        String reason;
+        try {
+            copy = watch.copy();
+            reason = Desktop.whyNotLoadable(copy.toString());
+        } catch (IOException e) {
+            copy = null;
+            reason = "cannot copy it: " + e.getMessage();
+        }
+        if (copy != null && reason == null && session.start(copy.toString(), true)) {
             running = copy;
             lastReload = "reloaded " + LocalTime.now().format(CLOCK);
             System.out.println("vi-live: reloaded " + options.plugin);
