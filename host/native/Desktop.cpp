@@ -1,7 +1,8 @@
 // Natives of com.tarq.vi.player.Desktop: what a phone gives its host and a
 // desktop does not. A headless EGL surface kept current on the calling thread
-// (the player's render thread), its pixels, the plug-in's asset directory,
-// the window rectangle, why a plug-in does not load, and the preloaded clock.
+// (the player's render thread), the current surface's pixels, any key code,
+// the plug-in's asset directory, the window rectangle, why a plug-in does not
+// load, and the preloaded clock. The live window uses all but the surface.
 #include <EGL/egl.h>
 #include <EGL/eglext.h>
 #include <GLES2/gl2.h>
@@ -106,10 +107,9 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(loseContext)(JNIEnv* env, jclass) {
     glViewport(0, 0, gSurface.width, gSurface.height);
 }
 
-// The current surface as ARGB ints, top row first (GL reads bottom row first).
-JNIEXPORT void JNICALL DESKTOP_NATIVE(readPixels)(JNIEnv* env, jclass, jintArray argb) {
-    const int width = gSurface.width;
-    const int height = gSurface.height;
+// The current surface (the pbuffer or the live window) as ARGB ints, top row
+// first (GL reads bottom row first).
+JNIEXPORT void JNICALL DESKTOP_NATIVE(readPixels)(JNIEnv* env, jclass, jintArray argb, jint width, jint height) {
     std::vector<uint8_t> rgba(size_t(width) * size_t(height) * 4);
     glPixelStorei(GL_PACK_ALIGNMENT, 4);
     glBindFramebuffer(GL_FRAMEBUFFER, 0);
@@ -125,6 +125,12 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(readPixels)(JNIEnv* env, jclass, jintArray
         }
     }
     env->SetIntArrayRegion(argb, 0, jsize(pixels.size()), pixels.data());
+}
+
+// The runtime's key handler takes any code; the phone's host interface passes
+// only the menu and volume keys, so developer keys come this way.
+JNIEXPORT void JNICALL DESKTOP_NATIVE(sendKey)(JNIEnv*, jclass, jint code) {
+    vi::Application::handleKey(static_cast<unsigned int>(code));
 }
 
 JNIEXPORT void JNICALL DESKTOP_NATIVE(setAssetDirectory)(JNIEnv* env, jclass, jstring directory) {

@@ -2,7 +2,7 @@ package com.tarq.vi.player;
 
 /**
  * What a phone gives its host and a desktop does not: a headless GL surface
- * current on the calling thread, its pixels, the plug-in's asset directory,
+ * current on the calling thread, the current surface's pixels, any key code, the plug-in's asset directory,
  * the window rectangle, why a plug-in does not load, and the preloaded clock.
  * Every method must be called on the thread that opened the surface.
  */
@@ -17,8 +17,11 @@ final class Desktop {
     /** Destroys the GL context and makes a new one current, as when the phone's host replaces it. */
     static native void loseContext();
 
-    /** The surface's pixels as opaque ARGB, top row first; argb holds width x height ints. */
-    static native void readPixels(int[] argb);
+    /** The current surface's pixels (this one's or the live window's) as opaque ARGB, top row first. */
+    static native void readPixels(int[] argb, int width, int height);
+
+    /** A key code straight to the runtime's key handler, as a phone's host has no entry for. */
+    static native void sendKey(int code);
 
     static native void setAssetDirectory(String directory);
 

@@ -3,6 +3,7 @@ package com.tarq.vi.player;
 import java.nio.file.Path;
 import java.util.LinkedHashMap;
 import java.util.Map;
+import java.util.Set;
 
 /** The player's command line. */
 final class Options {
@@ -49,6 +50,11 @@ final class Options {
     }
 
     static Options parse(String[] args) throws UsageException {
+        return parse(args, null);
+    }
+
+    /** Parses only the options in `accepted` (all when null); any other is unknown. */
+    static Options parse(String[] args, Set<String> accepted) throws UsageException {
         Options options = new Options();
         for (int i = 0; i < args.length; ++i) {
             String arg = args[i];
@@ -57,6 +63,7 @@ final class Options {
                 options.plugin = Path.of(arg);
                 continue;
             }
+            if (accepted != null && !accepted.contains(arg)) throw new UsageException("unknown option " + arg);
             switch (arg) {
                 case "--help" -> {
                     options.help = true;

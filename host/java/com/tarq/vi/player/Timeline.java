@@ -26,6 +26,7 @@ final class Timeline {
     private static final Map<String, String[]> FORMS = Map.ofEntries(
         Map.entry("touch", new String[] {"down|move|up", "X", "Y"}),
         Map.entry("key", new String[] {"menu|up|down"}),
+        Map.entry("keycode", new String[] {"CODE"}),
         Map.entry("orientation", new String[] {"0|1"}),
         Map.entry("param", new String[] {"A", "B"}),
         Map.entry("affordance", new String[] {}),
@@ -133,6 +134,10 @@ final class Timeline {
                 throw new TimelineException(source, line, "\"" + argument + "\" is not a valid " + form[i]
                     + " for \"" + kind + "\": " + usage);
             }
+        }
+        if (kind.equals("keycode") && Integer.parseInt(arguments.get(0)) == Session.BLOCKING_KEY) {
+            throw new TimelineException(source, line, "key code " + Session.BLOCKING_KEY + " is refused: the runtime"
+                + " handles it by taking its own lock a second time and would wait for ever (\"clear\" clears)");
         }
     }
 

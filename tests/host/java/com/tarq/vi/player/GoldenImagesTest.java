@@ -23,37 +23,8 @@ import org.junit.jupiter.params.provider.ValueSource;
  * or the gem missing.
  */
 class GoldenImagesTest {
-    /** Per channel, 0 to 255. */
-    private static final int TOLERANCE = 8;
-    /** Share of pixels allowed beyond the tolerance (edges that move by a pixel). */
-    private static final double OUTLIERS = 0.002;
-
     private static final Path GOLDEN = Path.of(System.getProperty("vi.golden"));
     private static final Path RENDERS = Path.of(System.getProperty("vi.renders"));
-
-    /** Pixels beyond the tolerance, or -1 for pictures of different sizes. */
-    static int beyondTolerance(BufferedImage a, BufferedImage b) {
-        if (a.getWidth() != b.getWidth() || a.getHeight() != b.getHeight()) return -1;
-        int count = 0;
-        for (int y = 0; y < a.getHeight(); ++y) {
-            for (int x = 0; x < a.getWidth(); ++x) {
-                int p = a.getRGB(x, y);
-                int q = b.getRGB(x, y);
-                for (int shift = 0; shift < 24; shift += 8) {
-                    if (Math.abs(((p >> shift) & 0xFF) - ((q >> shift) & 0xFF)) > TOLERANCE) {
-                        ++count;
-                        break;
-                    }
-                }
-            }
-        }
-        return count;
-    }
-
-    static boolean matches(BufferedImage picture, BufferedImage golden) {
-        int beyond = beyondTolerance(picture, golden);
-        return beyond >= 0 && beyond <= OUTLIERS * golden.getWidth() * golden.getHeight();
-    }
 
     private static BufferedImage read(Path file) throws IOException {
         BufferedImage image = ImageIO.read(file.toFile());
@@ -70,15 +41,17 @@ class GoldenImagesTest {
     void chosenFramesMatchTheirGoldens(String frame) throws IOException {
         BufferedImage golden = read(GOLDEN.resolve(frame));
         BufferedImage picture = rendered("run", frame);
-        assertTrue(matches(picture, golden), frame + ": " + beyondTolerance(picture, golden)
-            + " pixels differ by more than " + TOLERANCE);
+        assertTrue(PictureTolerance.matches(picture, golden), frame + ": "
+            + PictureTolerance.beyondTolerance(picture, golden)
+            + " pixels differ by more than " + PictureTolerance.TOLERANCE);
     }
 
     @ParameterizedTest
     @ValueSource(strings = {"no-touch", "other-grade", "no-gem"})
     void aRealChangeDoesNotMatch(String control) throws IOException {
         BufferedImage golden = read(GOLDEN.resolve("frame-00011.png"));
-        assertFalse(matches(rendered(control, "frame-00011.png"), golden), control + " passed for the golden");
+        assertFalse(PictureTolerance.matches(rendered(control, "frame-00011.png"), golden),
+            control + " passed for the golden");
     }
 
     @ParameterizedTest

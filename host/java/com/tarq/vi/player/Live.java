@@ -1,0 +1,293 @@
+package com.tarq.vi.player;
+
+import com.tarq.android.visualeffect.common.Native;
+import java.io.IOException;
+import java.nio.file.Files;
+import java.nio.file.Path;
+import java.nio.file.StandardCopyOption;
+import java.time.LocalTime;
+import java.time.format.DateTimeFormatter;
+import java.util.Map;
+import java.util.Set;
+import javax.imageio.ImageIO;
+
+/**
+ * The live host: an effect plug-in in a window, in real time, the mouse as
+ * the finger and keys for the host's events, through the same JNI calls a
+ * phone's host makes. A new build of the plug-in (or a change in its assets)
+ * restarts the effect from a fresh copy, in the same window. Started by the
+ * vi-live launcher, which names the libraries and preloads the clock library
+ * (the host keeps the effect's clock, so that a pause stops it).
+ */
+public final class Live implements Session.Surface {
+    static final String USAGE = String.join("\n",
+        "usage: vi-live [options] PLUGIN.so",
+        "Plays an effect plug-in in a window through the runtime's JNI host interface: the",
+        "mouse is the finger, keys send the host's events, and a new build of the plug-in",
+        "replaces the running one. Lines typed on standard input are host events as in a",
+        "timeline, without the time: \"keycode 1000\", \"param 1 100\", \"image NAME FILE\".",
+        "",
+        "  --image NAME=FILE    hand the runtime FILE (PNG or JPEG) under NAME; repeatable",
+        "  --assets DIR         the plug-in's asset directory (default: assets/ beside the plug-in)",
+        "  --size WxH           window size in pixels (default 540x960)",
+        "  --fixed-step         every frame advances the effect's clock by exactly 1/60 s",
+        "  --help               this text",
+        "",
+        "Keys:");
+    static final Set<String> OPTIONS = Set.of("--image", "--assets", "--size", "--fixed-step", "--help");
+
+    private static final long FRAME_NANOS = 1_000_000_000L / 60;
+    private static final DateTimeFormatter CLOCK = DateTimeFormatter.ofPattern("HH:mm:ss");
+
+    private final Options options;
+    private final Session session;
+    private final Native host;
+    private final FrameTimes frameTimes = new FrameTimes();
+    private final int[] event = new int[3];
+    private final String name;
+    private PluginWatch watch;
+    /** The copy of the plug-in the effect runs from. */
+    private Path running;
+    private String lastReload = "started";
+    /** The effect's clock, from the start; stands still while paused. */
+    private long effectNanos;
+    private boolean paused;
+    private boolean step;
+    private boolean redraw;
+    private boolean screenshot;
+    private boolean quit;
+
+    private Live(Options options) {
+        this.options = options;
+        session = new Session("vi-live", options.width, options.height);
+        host = session.host;
+        name = options.plugin.getFileName().toString();
+    }
+
+    public static void main(String[] args) {
+        int status;
+        try {
+            Options options = Options.parse(args, OPTIONS);
+            if (options.help) {
+                System.out.print(USAGE + "\n" + LiveKeys.table());
+            } else {
+                new Live(options).run();
+            }
+            status = 0;
+        } catch (Options.UsageException e) {
+            System.err.println("vi-live: " + e.getMessage());
+            System.err.print(USAGE + "\n" + LiveKeys.table());
+            status = 2;
+        } catch (Failure | IOException | IllegalStateException | UnsatisfiedLinkError e) {
+            System.err.println("vi-live: " + e.getMessage());
+            status = 1;
+        }
+        System.exit(status);
+    }
+
+    private void run() throws Failure, IOException {
+        Path plugin = options.plugin.toAbsolutePath();
+        if (!Files.isRegularFile(plugin)) throw new Failure("plug-in not found: " + options.plugin);
+        for (Map.Entry<String, Path> image : options.images.entrySet()) {
+            session.addImage(image.getKey(), image.getValue(), "--image " + image.getKey());
+        }
+        Path assets = Session.assetDirectory(plugin, options.assets);
+        Session.loadLibraries("vi-live", "vi.window");
+        if (!Desktop.setClock(Player.FIXED_CLOCK_START)) {
+            throw new Failure("the clock library is not preloaded; start it with vi-live");
+        }
+        openWindow();
+        try {
+            if (assets != null) Desktop.setAssetDirectory(assets.toString());
+            watch = new PluginWatch(plugin, assets);
+            running = watch.copy();
+            if (!session.start(running.toString(), false)) {
+                String reason = Desktop.whyNotLoadable(running.toString());
+                throw new Failure("cannot start the effect in " + options.plugin + ": "
+                    + (reason != null ? reason : "the runtime refused it"));
+            }
+            System.out.printf("vi-live: playing %s in a %dx%d window; h for the keys%n", options.plugin,
+                session.width(), session.height());
+            System.out.flush();
+            loop();
+            host.prehandleStop();
+        } finally {
+            Window.close();
+            if (watch != null) watch.close();
+        }
+        frameTimes.reportForBench();
+    }
+
+    private void openWindow() throws Failure {
+        try {
+            Window.open("vi-live: " + name, session.width(), session.height());
+        } catch (IllegalStateException e) {
+            throw new Failure(e.getMessage() + "; without a display, run it under xvfb-run (xvfb-run -a scripts/live)");
+        }
+    }
+
+    /** One frame a sixtieth of a second: events, a settled build, the frame, the title. */
+    private void loop() throws IOException {
+        String benchFrames = System.getenv("VI_BENCH_FRAMES");
+        int frames = benchFrames == null ? -1 : Integer.parseInt(benchFrames);
+        Console console = new Console();
+        long last = System.nanoTime();
+        long next = last;
+        long titled = 0;
+        while (!quit) {
+            long now = System.nanoTime();
+            if (!paused) effectNanos += options.fixedStep ? FRAME_NANOS : now - last;
+            last = now;
+            Desktop.setClock(Player.FIXED_CLOCK_START + effectNanos);
+            for (int kind = Window.nextEvent(event); kind != Window.NONE; kind = Window.nextEvent(event)) {
+                windowEvent(kind);
+            }
+            for (Timeline.Event typed = console.next(); typed != null; typed = console.next()) {
+                if (typed.kind().equals("end")) quit = true;
+                try {
+                    session.apply(typed, this, Path.of(""));
+                } catch (IOException e) {
+                    System.err.println("vi-live: stdin: " + e.getMessage());
+                }
+            }
+            if (watch.changedAndSettled(now)) reload();
+            if (step) effectNanos += FRAME_NANOS;
+            Desktop.setClock(Player.FIXED_CLOCK_START + effectNanos);
+            if (!paused || step || redraw || screenshot) frame();
+            if (now - titled >= 1_000_000_000L) {
+                titled = now;
+                Window.setTitle(title());
+            }
+            if (frames >= 0) {
+                quit |= frameTimes.count() >= frames;
+            } else {
+                next = pace(next);
+            }
+        }
+    }
+
+    private void frame() throws IOException {
+        long started = System.nanoTime();
+        host.prehandleDraw();
+        if (screenshot) saveScreenshot();
+        Window.swap();
+        frameTimes.add(System.nanoTime() - started);
+        step = redraw = screenshot = false;
+    }
+
+    private void windowEvent(int kind) throws IOException {
+        switch (kind) {
+            case Window.QUIT -> quit = true;
+            case Window.TOUCH_DOWN -> host.prehandleTouch(event[1], event[2], 0);
+            case Window.TOUCH_MOVE -> host.prehandleTouch(event[1], event[2], 2);
+            case Window.TOUCH_UP -> host.prehandleTouch(event[1], event[2], 1);
+            case Window.KEY -> key(LiveKeys.of(event[1]));
+            case Window.EXPOSED -> redraw = true;
+            default -> { }
+        }
+    }
+
+    private void key(LiveKeys key) throws IOException {
+        if (key == null) return;
+        switch (key) {
+            case AFFORDANCE -> host.prehandleAffordance();
+            case UNLOCK -> host.prehandleUnlock();
+            case CLEAR -> host.prehandleClearEffect();
+            case MENU -> host.prehandleMenuPressed();
+            case VOLUME_UP -> host.prehandleVolumeUpPressed();
+            case VOLUME_DOWN -> host.prehandleVolumeDownPressed();
+            case ORIENTATION -> session.rotate(session.orientation() == 0 ? 1 : 0, this);
+            case LOSE_CONTEXT -> loseContext();
+            case RESTART -> host.prehandleRestart();
+            case PAUSE -> paused = !paused;
+            case STEP -> step = paused;
+            case SCREENSHOT -> screenshot = true;
+            case RELOAD -> reload();
+            case HELP -> System.err.print(LiveKeys.table());
+            case QUIT -> quit = true;
+        }
+    }
+
+    /**
+     * Checks the plug-in as it is now, then restarts the effect from a fresh
+     * copy with the same window, orientation and images; a build that does
+     * not load leaves the running effect.
+     */
+    private void reload() {
+        watch.markLoaded();
+        Path copy;
+        String reason;
+        try {
+            copy = watch.copy();
+            reason = Desktop.whyNotLoadable(copy.toString());
+        } catch (IOException e) {
+            copy = null;
+            reason = "cannot copy it: " + e.getMessage();
+        }
+        if (copy != null && reason == null && session.start(copy.toString(), true)) {
+            running = copy;
+            lastReload = "reloaded " + LocalTime.now().format(CLOCK);
+            System.out.println("vi-live: reloaded " + options.plugin);
+            System.out.flush();
+        } else {
+            if (reason == null) {
+                reason = "the runtime refused it";
+                session.start(running.toString(), true);
+            }
+            lastReload = "reload failed " + LocalTime.now().format(CLOCK) + ": " + reason;
+            System.err.println("vi-live: the new build of " + options.plugin + " does not load, the running effect"
+                + " stays: " + reason);
+        }
+        Window.setTitle(title());
+    }
+
+    private String title() {
+        return "vi-live: " + name + " | " + frameTimes.summary() + (paused ? " | paused" : "") + " | " + lastReload
+            + " | " + LiveKeys.line();
+    }
+
+    /** The frame just drawn, before it is shown, into the next free live-NNN.png of the current folder. */
+    private void saveScreenshot() throws IOException {
+        Path file;
+        int number = 0;
+        do {
+            file = Path.of(String.format("live-%03d.png", ++number));
+        } while (Files.exists(file));
+        Path partial = Path.of("." + file + ".partial");
+        ImageIO.write(session.readFrame(), "png", partial.toFile());
+        Files.move(partial, file, StandardCopyOption.ATOMIC_MOVE);
+        System.out.println("vi-live: screenshot " + file.toAbsolutePath());
+        System.out.flush();
+    }
+
+    /** Waits for the next sixtieth of a second; a late frame moves the schedule rather than rushing the next. */
+    private static long pace(long next) {
+        next += FRAME_NANOS;
+        long wait = next - System.nanoTime();
+        if (wait <= 0) return System.nanoTime();
+        try {
+            Thread.sleep(wait / 1_000_000, (int) (wait % 1_000_000));
+        } catch (InterruptedException e) {
+            Thread.currentThread().interrupt();
+        }
+        return next;
+    }
+
+    @Override
+    public void resize(int width, int height) {
+        Window.resize(width, height);
+        int[] size = new int[2];
+        Window.size(size);
+        if (size[0] != width || size[1] != height) {
+            System.err.printf("vi-live: the window is %dx%d, not the %dx%d asked for%n", size[0], size[1], width,
+                height);
+        }
+    }
+
+    @Override
+    public void loseContext() {
+        Window.loseContext();
+        System.out.println("vi-live: GL context lost and replaced");
+        System.out.flush();
+    }
+}

@@ -1,0 +1,93 @@
+package com.tarq.vi.player;
+
+import java.io.IOException;
+import java.nio.file.Files;
+import java.nio.file.Path;
+import java.nio.file.StandardCopyOption;
+import java.nio.file.attribute.BasicFileAttributes;
+import java.util.Comparator;
+import java.util.Objects;
+import java.util.stream.Stream;
+
+/**
+ * Watches the plug-in file and its asset folder for a new build, and copies
+ * the plug-in to a fresh path for each load: the runtime never opens a path
+ * it has loaded again, and a build must not rewrite the library the effect
+ * runs from. Owns the folder of copies, deleted by close().
+ */
+final class PluginWatch implements AutoCloseable {
+    /** A change counts once the files have stayed as they are this long. */
+    private static final long SETTLE_NANOS = 300_000_000L;
+    private static final long LOOK_EVERY_NANOS = 100_000_000L;
+
+    private final Path plugin;
+    private final Path assets;
+    private final Path copies;
+    private int copied;
+    private String loaded;
+    private String seen;
+    private long seenSince;
+    private long lastLook;
+
+    PluginWatch(Path plugin, Path assets) throws IOException {
+        this.plugin = plugin;
+        this.assets = assets;
+        copies = Files.createTempDirectory("vi-live-");
+        loaded = signature();
+        seen = loaded;
+    }
+
+    /** A copy of the plug-in as it is now, at a path never used before. */
+    Path copy() throws IOException {
+        Path copy = copies.resolve(++copied + "-" + plugin.getFileName());
+        Files.copy(plugin, copy, StandardCopyOption.REPLACE_EXISTING);
+        return copy;
+    }
+
+    /** True once the files differ from those last loaded and have settled; looks at most ten times a second. */
+    boolean changedAndSettled(long now) {
+        if (now - lastLook < LOOK_EVERY_NANOS) return false;
+        lastLook = now;
+        String current = signature();
+        if (!current.equals(seen)) {
+            seen = current;
+            seenSince = now;
+            return false;
+        }
+        return !current.equals(loaded) && !current.isEmpty() && now - seenSince >= SETTLE_NANOS;
+    }
+
+    /** The files as they are now count as loaded, whether the load worked or not: a broken build waits for the next. */
+    void markLoaded() {
+        loaded = signature();
+        seen = loaded;
+    }
+
+    @Override
+    public void close() throws IOException {
+        try (Stream<Path> paths = Files.walk(copies)) {
+            for (Path path : paths.sorted(Comparator.reverseOrder()).toList()) Files.deleteIfExists(path);
+        }
+    }
+
+    /** The plug-in's size and time and every asset's; empty while the plug-in is missing (a build under way). */
+    private String signature() {
+        StringBuilder text = new StringBuilder();
+        try {
+            text.append(stamp(plugin));
+            if (assets != null) {
+                try (Stream<Path> paths = Files.walk(assets)) {
+                    for (Path path : paths.sorted().toList()) text.append('|').append(path).append(stamp(path));
+                }
+            }
+        } catch (IOException e) {
+            return "";
+        }
+        return text.toString();
+    }
+
+    private static String stamp(Path path) throws IOException {
+        BasicFileAttributes attributes = Files.readAttributes(path, BasicFileAttributes.class);
+        return attributes.size() + "@" + Objects.toString(attributes.lastModifiedTime().toInstant());
+    }
+}
