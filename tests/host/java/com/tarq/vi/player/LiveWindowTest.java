@@ -36,6 +36,7 @@ class LiveWindowTest {
     private static final Path BLUE = Path.of(System.getProperty("vi.blue"));
     private static final Path ORANGE = Path.of(System.getProperty("vi.orange"));
     private static final Path NO_FACTORY = Path.of(System.getProperty("vi.nofactory"));
+    private static final Path MISSING_SYMBOL = Path.of(System.getProperty("vi.missingsymbol"));
     private static final Path SCRATCH = Path.of(System.getProperty("vi.scratch"));
     private static final int BLUE_RGB = 0x2050E0;
     private static final int ORANGE_RGB = 0xF08020;
@@ -133,6 +134,8 @@ class LiveWindowTest {
         Files.writeString(SCRATCH.resolve("garbage.so"), "not a library\n".repeat(100));
         rebuild(SCRATCH.resolve("garbage.so"));
         awaitText(err, "invalid ELF header");
+        rebuild(MISSING_SYMBOL);
+        awaitText(err, "undefined symbol: absentFromEveryLibrary");
         assertEquals(ORANGE_RGB, shot().getRGB(90, 160) & 0xFFFFFF);
         await("the failure in the title", () -> run("xdotool", "getwindowname", window).contains("reload failed"));
     }
