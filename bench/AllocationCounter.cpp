@@ -5,129 +5,87 @@
 #include <atomic>
 #include <cstdint>
 #include <cstdlib>
-#include <cstring>
 #include <new>
-
-extern "C" {
-void* __libc_malloc(size_t size);
-void* __libc_calloc(size_t count, size_t size);
-void* __libc_realloc(void* pointer, size_t size);
-void __libc_free(void* pointer);
-}
 
 namespace {
 
-struct Range {
-    std::uintptr_t begin;
-    std::uintptr_t end;
-};
+const int kMaxRanges = 8;
+std::uintptr_t gRanges[kMaxRanges][2];  // watched code: [begin, end)
+std::atomic<int> gRangeCount{0};
+std::atomic<bool> gCounting{false};
+std::atomic<long> gNews{0};
+std::atomic<long> gMallocs{0};
 
-const int kMaxRanges = 16;
-Range gRanges[kMaxRanges];
-std::atomic<int> gRangeCount(0);
-std::atomic<bool> gCounting(false);
-std::atomic<long> gNews(0);
-std::atomic<long> gWatchedMallocs(0);
-std::atomic<long> gOtherMallocs(0);
-
-bool isWatched(const void* caller) {
-    const std::uintptr_t address = reinterpret_cast<std::uintptr_t>(caller);
-    const int count = gRangeCount.load(std::memory_order_relaxed);
-    for (int i = 0; i < count; ++i)
-        if (address >= gRanges[i].begin && address < gRanges[i].end) return true;
-    return false;
-}
-
-void noteMalloc(const void* caller) {
-    if (!gCounting.load(std::memory_order_relaxed)) return;
-    if (isWatched(caller))
-        gWatchedMallocs.fetch_add(1, std::memory_order_relaxed);
-    else
-        gOtherMallocs.fetch_add(1, std::memory_order_relaxed);
-}
-
-void noteNew() {
-    if (gCounting.load(std::memory_order_relaxed)) gNews.fetch_add(1, std::memory_order_relaxed);
-}
-
-void* allocate(std::size_t size) {
-    noteNew();
-    void* pointer = __libc_malloc(size ? size : 1);
-    if (!pointer) throw std::bad_alloc();
-    return pointer;
-}
-
-int addRanges(dl_phdr_info* info, size_t, void* data) {
-    const char* pathPart = static_cast<const char*>(data);
-    if (!info->dlpi_name || !std::strstr(info->dlpi_name, pathPart)) return 0;
-    for (int i = 0; i < info->dlpi_phnum; ++i) {
-        const ElfW(Phdr)& header = info->dlpi_phdr[i];
-        if (header.p_type != PT_LOAD || !(header.p_flags & PF_X)) continue;
-        const int index = gRangeCount.load();
-        if (index == kMaxRanges) return 1;
-        gRanges[index].begin = info->dlpi_addr + header.p_vaddr;
-        gRanges[index].end = gRanges[index].begin + header.p_memsz;
-        gRangeCount.store(index + 1);
+// dl_iterate_phdr callback: watches the loaded segment that holds `function`.
+int watchSegmentHolding(dl_phdr_info* info, size_t, void* function) {
+    const auto address = reinterpret_cast<std::uintptr_t>(function);
+    for (int i = 0; i < info->dlpi_phnum && gRangeCount < kMaxRanges; ++i) {
+        const ElfW(Phdr)& segment = info->dlpi_phdr[i];
+        const std::uintptr_t begin = info->dlpi_addr + segment.p_vaddr;
+        if (segment.p_type != PT_LOAD || address < begin || address >= begin + segment.p_memsz) continue;
+        gRanges[gRangeCount][0] = begin;
+        gRanges[gRangeCount][1] = begin + segment.p_memsz;
+        return ++gRangeCount;
     }
-    return 1;
+    return 0;
 }
 
 }  // namespace
 
-extern "C" {
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+static const bool kCountsMallocs = false;
+static void* heapAllocate(std::size_t size) { return std::malloc(size); }
+#else
+static const bool kCountsMallocs = true;
+extern "C" void* __libc_malloc(size_t size);
+// Not through malloc, so that operator new's own call is not counted again.
+static void* heapAllocate(std::size_t size) { return __libc_malloc(size); }
 
-void* malloc(size_t size) {
-    noteMalloc(__builtin_return_address(0));
+extern "C" void* malloc(size_t size) {
+    const auto caller = reinterpret_cast<std::uintptr_t>(__builtin_return_address(0));
+    for (int i = 0; gCounting && i < gRangeCount; ++i)
+        if (caller >= gRanges[i][0] && caller < gRanges[i][1]) {
+            ++gMallocs;
+            break;
+        }
     return __libc_malloc(size);
 }
+#endif
 
-void* calloc(size_t count, size_t size) {
-    noteMalloc(__builtin_return_address(0));
-    return __libc_calloc(count, size);
-}
-
-void* realloc(void* pointer, size_t size) {
-    noteMalloc(__builtin_return_address(0));
-    return __libc_realloc(pointer, size);
-}
-
-void free(void* pointer) { __libc_free(pointer); }
-
-}  // extern "C"
-
-void* operator new(std::size_t size) { return allocate(size); }
-void* operator new[](std::size_t size) { return allocate(size); }
+// Every form that the replaced deletes free, the nothrow ones too: the GL
+// driver's compiler allocates with those and frees through operator delete.
 void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    noteNew();
-    return __libc_malloc(size ? size : 1);
+    if (gCounting) ++gNews;
+    return heapAllocate(size ? size : 1);
 }
-void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
-    noteNew();
-    return __libc_malloc(size ? size : 1);
+void* operator new[](std::size_t size, const std::nothrow_t& tag) noexcept { return operator new(size, tag); }
+void* operator new(std::size_t size) {
+    if (void* pointer = operator new(size, std::nothrow)) return pointer;
+    throw std::bad_alloc();
 }
-void operator delete(void* pointer) noexcept { __libc_free(pointer); }
-void operator delete[](void* pointer) noexcept { __libc_free(pointer); }
-void operator delete(void* pointer, std::size_t) noexcept { __libc_free(pointer); }
-void operator delete[](void* pointer, std::size_t) noexcept { __libc_free(pointer); }
+void* operator new[](std::size_t size) { return operator new(size); }
+void operator delete(void* pointer) noexcept { std::free(pointer); }
+void operator delete[](void* pointer) noexcept { std::free(pointer); }
+void operator delete(void* pointer, std::size_t) noexcept { std::free(pointer); }
+void operator delete[](void* pointer, std::size_t) noexcept { std::free(pointer); }
 
 namespace vibench {
 
-bool AllocationCounter::watchLibrary(const char* pathPart) {
-    const int before = gRangeCount.load();
-    dl_iterate_phdr(addRanges, const_cast<char*>(pathPart));
-    return gRangeCount.load() > before;
+bool AllocationCounter::watchCodeOf(const void* function) {
+    return dl_iterate_phdr(watchSegmentHolding, const_cast<void*>(function)) != 0;
 }
+
+bool AllocationCounter::countsMallocs() { return kCountsMallocs; }
 
 void AllocationCounter::start() {
     gNews = 0;
-    gWatchedMallocs = 0;
-    gOtherMallocs = 0;
+    gMallocs = 0;
     gCounting = true;
 }
 
-AllocationCount AllocationCounter::stop() {
+Allocations AllocationCounter::stop() {
     gCounting = false;
-    return AllocationCount{gNews.load(), gWatchedMallocs.load(), gOtherMallocs.load()};
+    return Allocations{gNews, gMallocs};
 }
 
 }  // namespace vibench

@@ -1,28 +1,25 @@
 #pragma once
 
-// Counts heap allocations while switched on: every operator new, wherever it
-// is called from, and every malloc, calloc and realloc, told apart by whether
-// the call came from the code of a watched library (the runtime, a plug-in)
-// or from elsewhere (the GL driver, the C library). The bench binary defines
-// the allocation functions itself and forwards them to the C library's.
-
-#include <cstddef>
+// Counts heap allocations while switched on; the bench and the allocation
+// test compile it in. It replaces the global operator new (every caller
+// counts) and malloc (only calls from watched code count: the GL driver's and
+// the C library's own bookkeeping is not the runtime's business). The runtime
+// and the sample call neither calloc nor realloc. The sanitizers own malloc:
+// under them only operator new counts.
 
 namespace vibench {
 
-struct AllocationCount {
-    long news;             // operator new and new[], any caller
-    long watchedMallocs;   // malloc family called from a watched library
-    long otherMallocs;     // malloc family called from anywhere else
+struct Allocations {
+    long news;     // operator new and new[], any caller
+    long mallocs;  // malloc called from watched code
 };
 
-class AllocationCounter {
-public:
-    // Watches the executable code of the loaded library whose path contains
-    // `pathPart`. False when no such library is loaded.
-    static bool watchLibrary(const char* pathPart);
-    static void start();
-    static AllocationCount stop();
-};
+namespace AllocationCounter {
+// Watches the code of the loaded object (executable or library) holding `function`.
+bool watchCodeOf(const void* function);
+bool countsMallocs();
+void start();
+Allocations stop();
+}  // namespace AllocationCounter
 
 }  // namespace vibench

@@ -3,65 +3,37 @@
 // irreducible work of such a frame written out by hand: the lock, the context
 // handle, the two probes, one clock reading, the animation updates and the
 // scene's draw.
-#include <pthread.h>
-#include <time.h>
-
-#include <benchmark/benchmark.h>
-
-#include <vector>
-
-#include "Application/Animation.h"
 #include "Application/AnimationManager.h"
 #include "Application/Application.h"
 #include "Application/ApplicationVar.h"
-#include "Application/Scene.h"
 #include "Application/Timer.h"
-#include "BenchContext.h"
-#include "BenchShaders.h"
-#include "PairedTimes.h"
-#include "Render/Drawable.h"
-#include "Render/GL.h"
-#include "Render/Renderer.h"
-#include "Render/ShaderProgram.h"
-#include "Render/Texture.h"
+#include "Bench.h"
 
 namespace {
 
-const int kAnimations = 4;
+const int kBatch = 2000;  // frames per pass of each side: enough for the clock's resolution
 
-class EmptyScene : public vi::Scene {
-public:
+struct EmptyScene : vi::Scene {
     explicit EmptyScene(const int* size) : vi::Scene(size) {}
     int draw() override { return 0; }
 };
 
 vi::Scene* createEmptyScene(int* size, vi::ModelsMap*, vi::TexturesMap*) { return new EmptyScene(size); }
 
-class LinearAnimation : public vi::Animation {
-public:
-    explicit LinearAnimation(float rate) : mRate(rate), mValue(0.0f) {}
-    void update(float now) override { mValue = mRate * now; }
-
-private:
-    float mRate;
-    float mValue;
+struct LinearAnimation : vi::Animation {
+    LinearAnimation(float rate) : rate(rate) {}
+    void update(float now) override { value = rate * now; }
+    float rate, value = 0.0f;
 };
 
-// A started and initialised scene, one renderer (so the frame probes a
-// program) and one allocated texture (so it probes a texture), and the
-// animations; all gone again at the end of the run.
-class ReadyFrame {
-public:
-    ReadyFrame()
-        : mProgram(vibench::kQuadVertex, vibench::kQuadFragment),
-          mRenderer(mProgram, mDrawable),
-          mPixels(16 * 16, 0xFF336699u),
-          mTexture(mPixels.data(), 16, 16, true, false, false, true, false, 4, false) {
+// A started and initialised scene, one textured quad (so that the frame
+// probes a program and a texture) and the animations; all gone at the end.
+struct ReadyFrame {
+    ReadyFrame() : program(vitest::quadVertexShader(), vibench::kTexturedFragment), quad(program, pixels, 16) {
         if (vi::Renderer::mAllRenderers.size() != 1 || vi::Texture::mAllTextures.size() != 1)
             vibench::benchFail("frame: the registries hold objects of another figure");
-        mTexture.allocate();
-        for (int i = 0; i < kAnimations; ++i) mAnimations.emplace_back(0.5f + float(i));
-        for (LinearAnimation& animation : mAnimations) vi::AnimationManager::mStorage.push_back(&animation);
+        quad.texture.allocate();
+        for (LinearAnimation& animation : animations) vi::AnimationManager::mStorage.push_back(&animation);
         vi::gCreateScene = createEmptyScene;
         vi::Application::handleStart(0, 0, 64, 64);
         vi::Application::handleInitEffect();
@@ -74,27 +46,18 @@ public:
         vi::AnimationManager::mStorage.clear();
     }
 
-    GLuint programName() const { return mProgram.program; }
-    GLuint textureName() const { return mTexture.mId; }
-
-private:
-    vi::ShaderProgram mProgram;
-    vi::Drawable mDrawable;
-    vi::Renderer mRenderer;
-    std::vector<unsigned int> mPixels;
-    vi::Texture mTexture;
-    std::vector<LinearAnimation> mAnimations;
+    unsigned int pixels[16 * 16] = {};
+    vi::ShaderProgram program;
+    vibench::TexturedQuad quad;
+    std::vector<LinearAnimation> animations{0.5f, 1.5f, 2.5f, 3.5f};
 };
-
-// Frames per batch of each side: enough for the clock's resolution.
-const int kBatch = 2000;
 
 void frame(benchmark::State& state) {
     vibench::mainContext();
-    ReadyFrame frame;
+    ReadyFrame ready;
     const EGLContext context = eglGetCurrentContext();
-    const GLuint program = frame.programName();
-    const GLuint texture = frame.textureName();
+    const GLuint program = ready.program.program;
+    const GLuint texture = ready.quad.texture.mId;
     const timespec start = vi::Timer::mStartingCnt;
     auto byHand = [&] {
         pthread_mutex_lock(&vi::ApplicationVar::msCriticalSection);
@@ -114,8 +77,9 @@ void frame(benchmark::State& state) {
         pthread_mutex_unlock(&vi::ApplicationVar::msCriticalSection);
         benchmark::DoNotOptimize(result);
     };
+    auto handleDraw = [] { benchmark::DoNotOptimize(vi::Application::handleDraw()); };
     vibench::PairedTimes times(state);
-    for (auto _ : state) times.pass(kBatch, [] { benchmark::DoNotOptimize(vi::Application::handleDraw()); }, byHand);
+    for (auto _ : state) times.passBatches(kBatch, handleDraw, byHand);
     times.finish();
 }
 

@@ -1,17 +1,15 @@
 // A steady frame allocates nothing: repeated draws of a renderer with
 // attributes, uniforms, plain, dynamic and curve textures and a dynamic
-// render target make no heap allocation after the first frame. This binary
-// replaces the global operator new (every caller counts) and malloc (only
-// calls made from this executable count: the GL driver's own bookkeeping is
-// not the runtime's business).
+// render target make no heap allocation after the first frame. The counter
+// sees every operator new, and the mallocs made from this executable, which
+// holds the runtime (the GL driver's own bookkeeping is not the runtime's).
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <cstdint>
 #include <cstdlib>
-#include <new>
 #include <vector>
 
+#include "AllocationCounter.h"
 #include "GlContext.h"
 #include "Painters.h"
 #include "Render/Curves.h"
@@ -22,48 +20,9 @@
 
 namespace {
 
-std::atomic<bool> gCounting{false};
-std::atomic<int> gNewCount{0};
-std::atomic<int> gMallocCount{0};
-
-void* countedNew(std::size_t size) {
-    if (gCounting) ++gNewCount;
-    if (void* p = std::malloc(size ? size : 1)) return p;
-    throw std::bad_alloc();
-}
-
-}  // namespace
-
-// Every form that the replaced deletes below free, the nothrow ones too: the
-// GL driver's compiler allocates with those and frees through operator delete.
-void* operator new(std::size_t size) { return countedNew(size); }
-void* operator new[](std::size_t size) { return countedNew(size); }
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    if (gCounting) ++gNewCount;
-    return std::malloc(size ? size : 1);
-}
-void* operator new[](std::size_t size, const std::nothrow_t& tag) noexcept { return operator new(size, tag); }
-void operator delete(void* p) noexcept { std::free(p); }
-void operator delete[](void* p) noexcept { std::free(p); }
-void operator delete(void* p, std::size_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::size_t) noexcept { std::free(p); }
-
-// The sanitizers own malloc; there the operator new count alone applies.
-#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
-extern "C" {
-extern char __executable_start;
-extern char etext;
-void* __libc_malloc(std::size_t size);
-
-void* malloc(std::size_t size) {
-    const char* caller = static_cast<const char*>(__builtin_return_address(0));
-    if (gCounting && caller >= &__executable_start && caller < &etext) ++gMallocCount;
-    return __libc_malloc(size);
-}
-}
-#endif
-
-namespace {
+// Any function of this executable: the counter watches the code holding it.
+void* volatile gRaw;
+void allocateRaw() { gRaw = std::malloc(16); }
 
 const char* const kVertex =
     "attribute vec2 aPosition;\n"
@@ -126,7 +85,8 @@ TEST(SteadyFrame, AllocatesNothingAfterTheFirstFrame) {
 
     renderer.render();  // the first frame may set things up
 
-    gCounting = true;
+    ASSERT_TRUE(vibench::AllocationCounter::watchCodeOf(reinterpret_cast<void*>(&allocateRaw)));
+    vibench::AllocationCounter::start();
     for (int frame = 0; frame < 20; ++frame) {
         tint.g = 0.05f * float(frame);
         live[0] = std::uint8_t(frame);
@@ -135,28 +95,22 @@ TEST(SteadyFrame, AllocatesNothingAfterTheFirstFrame) {
         renderer.render();
     }
     glFinish();
-    gCounting = false;
-
-    EXPECT_EQ(gNewCount.load(), 0);
-    EXPECT_EQ(gMallocCount.load(), 0);
+    const vibench::Allocations counted = vibench::AllocationCounter::stop();
+    EXPECT_EQ(counted.news, 0);
+    EXPECT_EQ(counted.mallocs, 0);
 }
 
-// The counters themselves must see what they are meant to see.
-std::vector<int>* volatile gMade;
-void* volatile gRaw;
+// The counter itself must see what it is meant to see.
+int* volatile gMade;
 
 TEST(SteadyFrame, CountersNoticeAllocations) {
-    gCounting = true;
-    gMade = new std::vector<int>(3);
-    gCounting = false;
-    EXPECT_GE(gNewCount.load(), 1);
-#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
-    gMallocCount = 0;
-    gCounting = true;
-    gRaw = std::malloc(16);
-    gCounting = false;
-    EXPECT_EQ(gMallocCount.load(), 1);
-#endif
+    ASSERT_TRUE(vibench::AllocationCounter::watchCodeOf(reinterpret_cast<void*>(&allocateRaw)));
+    vibench::AllocationCounter::start();
+    gMade = new int(3);
+    allocateRaw();
+    const vibench::Allocations counted = vibench::AllocationCounter::stop();
+    EXPECT_EQ(counted.news, 1);
+    EXPECT_EQ(counted.mallocs, vibench::AllocationCounter::countsMallocs() ? 1 : 0);
     std::free(gRaw);
     delete gMade;
 }
