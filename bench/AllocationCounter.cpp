@@ -33,10 +33,10 @@ int watchSegmentHolding(dl_phdr_info* info, size_t, void* function) {
 }  // namespace
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-static const bool kCountsMallocs = false;
+bool vibench::AllocationCounter::countsMallocs() { return false; }
 static void* heapAllocate(std::size_t size) { return std::malloc(size); }
 #else
-static const bool kCountsMallocs = true;
+bool vibench::AllocationCounter::countsMallocs() { return true; }
 extern "C" void* __libc_malloc(size_t size);
 // Not through malloc, so that operator new's own call is not counted again.
 static void* heapAllocate(std::size_t size) { return __libc_malloc(size); }
@@ -74,8 +74,6 @@ namespace vibench {
 bool AllocationCounter::watchCodeOf(const void* function) {
     return dl_iterate_phdr(watchSegmentHolding, const_cast<void*>(function)) != 0;
 }
-
-bool AllocationCounter::countsMallocs() { return kCountsMallocs; }
 
 void AllocationCounter::start() {
     gNews = 0;

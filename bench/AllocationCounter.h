@@ -9,10 +9,8 @@
 
 namespace vibench {
 
-struct Allocations {
-    long news;     // operator new and new[], any caller
-    long mallocs;  // malloc called from watched code
-};
+// news: operator new and new[], any caller; mallocs: malloc called from watched code.
+struct Allocations { long news, mallocs; };
 
 namespace AllocationCounter {
 // Watches the code of the loaded object (executable or library) holding `function`.

@@ -33,12 +33,14 @@ vitest::GlContext& mainContext();
 // print a ratio.
 [[noreturn]] void benchFail(const char* what);
 
-// Seconds of the thread's CPU time that `count` runs of `operation` take.
+// Seconds of the thread's CPU time that `count` runs of `operation` take,
+// with the GL work they queued.
 template <typename Operation>
 double timeOf(int count, Operation&& operation) {
     timespec start, end;
     clock_gettime(CLOCK_THREAD_CPUTIME_ID, &start);
     for (int i = 0; i < count; ++i) operation();
+    glFinish();
     benchmark::ClobberMemory();
     clock_gettime(CLOCK_THREAD_CPUTIME_ID, &end);
     return double(end.tv_sec - start.tv_sec) + double(end.tv_nsec - start.tv_nsec) * 1e-9;

@@ -18,8 +18,6 @@ struct EmptyScene : vi::Scene {
     int draw() override { return 0; }
 };
 
-vi::Scene* createEmptyScene(int* size, vi::ModelsMap*, vi::TexturesMap*) { return new EmptyScene(size); }
-
 struct LinearAnimation : vi::Animation {
     LinearAnimation(float rate) : rate(rate) {}
     void update(float now) override { value = rate * now; }
@@ -34,7 +32,7 @@ struct ReadyFrame {
             vibench::benchFail("frame: the registries hold objects of another figure");
         quad.texture.allocate();
         for (LinearAnimation& animation : animations) vi::AnimationManager::mStorage.push_back(&animation);
-        vi::gCreateScene = createEmptyScene;
+        vi::gCreateScene = [](int* size, vi::ModelsMap*, vi::TexturesMap*) -> vi::Scene* { return new EmptyScene(size); };
         vi::Application::handleStart(0, 0, 64, 64);
         vi::Application::handleInitEffect();
         // The first frame finds a context it has not seen and rebuilds; from
@@ -56,16 +54,14 @@ void frame(benchmark::State& state) {
     vibench::mainContext();
     ReadyFrame ready;
     const EGLContext context = eglGetCurrentContext();
-    const GLuint program = ready.program.program;
-    const GLuint texture = ready.quad.texture.mId;
     const timespec start = vi::Timer::mStartingCnt;
     auto byHand = [&] {
         pthread_mutex_lock(&vi::ApplicationVar::msCriticalSection);
         int result = 0;
         if (vi::gpScene) {
             if (eglGetCurrentContext() == context) {
-                benchmark::DoNotOptimize(glIsProgram(program));
-                benchmark::DoNotOptimize(glIsTexture(texture));
+                benchmark::DoNotOptimize(glIsProgram(ready.program.program));
+                benchmark::DoNotOptimize(glIsTexture(ready.quad.texture.mId));
             }
             timespec now;
             clock_gettime(CLOCK_REALTIME, &now);

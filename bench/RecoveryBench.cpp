@@ -18,15 +18,14 @@ namespace {
 const int kRenderersPerProgram = 25;
 const unsigned int kTextureSide = 32;
 
-// The programs differ in a comment, so that each is compiled on its own, as
-// the different programs of an effect are.
-std::string variant(const char* source, int index) { return "// program " + std::to_string(index) + "\n" + source; }
-
 struct RendererSet {
     RendererSet(int count, unsigned int* pixels) {
-        for (int p = 0; p * kRenderersPerProgram < count; ++p)
-            programs.emplace_back(new vi::ShaderProgram(variant(vitest::quadVertexShader(), p),
-                                                        variant(vibench::kTexturedFragment, p)));
+        // The programs differ in a comment, so that each is compiled on its
+        // own, as the different programs of an effect are.
+        for (int p = 0; p * kRenderersPerProgram < count; ++p) {
+            const std::string tag = "// program " + std::to_string(p) + "\n";
+            programs.emplace_back(new vi::ShaderProgram(tag + vitest::quadVertexShader(), tag + vibench::kTexturedFragment));
+        }
         for (int i = 0; i < count; ++i)
             quads.emplace_back(new vibench::TexturedQuad(*programs[i / kRenderersPerProgram], pixels, kTextureSide));
     }
@@ -55,10 +54,7 @@ void checkRebuilt(std::size_t renderers) {
 // One recovery: the context is lost (not timed) and the frame's check rebuilds.
 double timeRecovery(vitest::GlContext& context) {
     context.recreate();
-    return vibench::timeOf(1, [] {
-        vi::ContextRecovery::recoverIfLost();
-        glFinish();
-    });
+    return vibench::timeOf(1, vi::ContextRecovery::recoverIfLost);
 }
 
 // One fresh making: the set is deleted and the context replaced (not timed),
@@ -69,10 +65,7 @@ double timeFresh(vitest::GlContext& context, std::unique_ptr<RendererSet>& set, 
     // The runtime's own check notices the new context before the making, so
     // that neither side pays for noticing it.
     vi::ContextRecovery::invalidateIfLost();
-    return vibench::timeOf(1, [&] {
-        set.reset(new RendererSet(count, pixels));
-        glFinish();
-    });
+    return vibench::timeOf(1, [&] { set.reset(new RendererSet(count, pixels)); });
 }
 
 // "recovery": rebuilding 100 after a loss against making 100 from nothing.

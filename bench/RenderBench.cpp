@@ -19,14 +19,10 @@ const float kTexCoords[] = {0, 0, 1, 0, 0, 1, 1, 1, 1, 1, 0, 1, 1, 0, 0, 0};
 const unsigned short kIndices[] = {0, 2, 1, 1, 2, 3, 4, 5, 6, 5, 7, 6, 0, 1, 4, 1, 5, 4,
                                    2, 6, 3, 3, 6, 7, 0, 4, 2, 2, 4, 6, 1, 3, 5, 3, 7, 5};
 
-struct Attribute {
-    const char* name;
-    const float* data;
-    int components;
-    bool isStatic;
-};
-const Attribute kAttributes[] = {
-    {"aPosition", kCorners, 3, true}, {"aNormal", kCorners, 3, true}, {"aTexCoord", kTexCoords, 2, false}};
+struct Attribute { const char* name; const float* data; GLsizeiptr bytes; int components; bool isStatic; };
+const Attribute kAttributes[] = {{"aPosition", kCorners, sizeof(kCorners), 3, true},
+                                 {"aNormal", kCorners, sizeof(kCorners), 3, true},
+                                 {"aTexCoord", kTexCoords, sizeof(kTexCoords), 2, false}};
 
 // Small weights keep every uniform active without changing the picture much;
 // a multiplication by zero would let the compiler drop the uniform.
@@ -80,7 +76,7 @@ struct RenderSetup {
         for (int i = 0; i < 3; ++i) {
             locations[i] = GLuint(glGetAttribLocation(program.program, kAttributes[i].name));
             glBindBuffer(GL_ARRAY_BUFFER, buffers[i]);
-            glBufferData(GL_ARRAY_BUFFER, bytes(kAttributes[i]), kAttributes[i].data, GL_STATIC_DRAW);
+            glBufferData(GL_ARRAY_BUFFER, kAttributes[i].bytes, kAttributes[i].data, GL_STATIC_DRAW);
             glEnableVertexAttribArray(locations[i]);
         }
         glBindBuffer(GL_ELEMENT_ARRAY_BUFFER, buffers[3]);
@@ -92,8 +88,6 @@ struct RenderSetup {
         glDeleteBuffers(4, buffers);
         glDisable(GL_CULL_FACE);
     }
-
-    static GLsizeiptr bytes(const Attribute& attribute) { return GLsizeiptr(8 * attribute.components * sizeof(float)); }
 
     // The renderer's work by hand, with the derived matrices from GLM's
     // general operations.
@@ -107,7 +101,7 @@ struct RenderSetup {
         for (int i = 0; i < 3; ++i) {
             glBindBuffer(GL_ARRAY_BUFFER, buffers[i]);
             if (!kAttributes[i].isStatic)
-                glBufferData(GL_ARRAY_BUFFER, bytes(kAttributes[i]), kAttributes[i].data, GL_STREAM_DRAW);
+                glBufferData(GL_ARRAY_BUFFER, kAttributes[i].bytes, kAttributes[i].data, GL_STREAM_DRAW);
             glVertexAttribPointer(locations[i], kAttributes[i].components, GL_FLOAT, GL_FALSE, 0, 0);
         }
 
