@@ -12,6 +12,7 @@
 //   vi_soak_cycles [--cycles N] [--sample PATH]
 #include <sys/resource.h>
 
+#include <array>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -22,7 +23,6 @@
 #include "Application/ApplicationVar.h"
 #include "FakeJni.h"
 #include "GlContext.h"
-#include "Natives.h"
 #include "Render/Renderer.h"
 #include "Render/Texture.h"
 
@@ -33,13 +33,8 @@ const int kRecycleEvery = 70;
 const int kLossEvery = 90;
 const int kFailedStartEvery = 250;
 
-struct Sizes {
-    std::size_t renderers, textures, texturesMap, modelsMap, animations;
-    bool operator!=(const Sizes& other) const {
-        return renderers != other.renderers || textures != other.textures || texturesMap != other.texturesMap ||
-               modelsMap != other.modelsMap || animations != other.animations;
-    }
-};
+// Renderers and textures registered, textures and models filed, animations.
+using Sizes = std::array<std::size_t, 5>;
 
 Sizes sizes() {
     return Sizes{vi::Renderer::mAllRenderers.size(), vi::Texture::mAllTextures.size(),
@@ -50,7 +45,7 @@ Sizes sizes() {
 void print(const char* when, const Sizes& s) {
     std::printf("cycles: %s: %zu renderers, %zu textures registered; %zu textures and %zu models filed; "
                 "%zu animations\n",
-                when, s.renderers, s.textures, s.texturesMap, s.modelsMap, s.animations);
+                when, s[0], s[1], s[2], s[3], s[4]);
 }
 
 long residentKilobytes() {
@@ -84,10 +79,10 @@ int main(int argc, char** argv) {
     setvbuf(stdout, nullptr, _IOLBF, 0);
 
     vitest::GlContext context(64, 64);
-    visoak::FakeJni jni;
+    vitest::FakeJni jni;
     JNIEnv* env = jni.env();
     jobject thiz = jni.thiz();
-    Sizes first = {0, 0, 0, 0, 0};
+    Sizes first = {};
     int failedStarts = 0;
 
     for (int cycle = 0; cycle < cycles; ++cycle) {
@@ -95,7 +90,7 @@ int main(int argc, char** argv) {
             // A library without a factory: null, and the path's UTF chars
             // kept by the runtime, as designed. The host's next start names
             // the sample again, which the runtime then opens anew.
-            if (VI_SOAK_NATIVE(prehandleStart)(env, thiz, jni.string(noFactory), 540, 960)) {
+            if (VI_NATIVE(prehandleStart)(env, thiz, jni.string(noFactory), 540, 960)) {
                 std::printf("cycles: a start of a library without a factory returned names\n");
                 return 1;
             }
@@ -103,7 +98,7 @@ int main(int argc, char** argv) {
             // As a JVM would: the chars stay allocated and nobody holds them.
             jni.forgetOutstandingUtfChars();
         }
-        jobjectArray names = VI_SOAK_NATIVE(prehandleStart)(env, thiz, jni.string(sample), 540, 960);
+        jobjectArray names = VI_NATIVE(prehandleStart)(env, thiz, jni.string(sample), 540, 960);
         std::vector<std::string> values;
         if (!names || !jni.stringArrayValues(names, values)) {
             std::printf("cycles: cycle %d: the sample did not start (%s)\n", cycle, sample.c_str());
@@ -112,20 +107,20 @@ int main(int argc, char** argv) {
         if (cycle % kWallpaperEvery == 0 && !values.empty()) {
             const int width = 40 + cycle % 7;
             const int height = 72 + cycle % 5;
-            VI_SOAK_NATIVE(loadTexture)(env, nullptr, jni.string(values[0]), jni.intArray(wallpaper(cycle, width, height)),
+            VI_NATIVE(loadTexture)(env, nullptr, jni.string(values[0]), jni.intArray(wallpaper(cycle, width, height)),
                                         width, height);
         }
-        VI_SOAK_NATIVE(prehandleInitEffect)(env, thiz);
-        VI_SOAK_NATIVE(prehandleDraw)(env, thiz);
-        if (cycle % kRecycleEvery == kRecycleEvery - 1) VI_SOAK_NATIVE(prehandleRecycleTextures)(env, thiz);
+        VI_NATIVE(prehandleInitEffect)(env, thiz);
+        VI_NATIVE(prehandleDraw)(env, thiz);
+        if (cycle % kRecycleEvery == kRecycleEvery - 1) VI_NATIVE(prehandleRecycleTextures)(env, thiz);
         if (cycle % kLossEvery == kLossEvery - 1) {
             context.recreate();
-            VI_SOAK_NATIVE(prehandleDraw)(env, thiz);
+            VI_NATIVE(prehandleDraw)(env, thiz);
         }
         if (cycle % 2)
-            VI_SOAK_NATIVE(prehandlePause)(env, thiz);
+            VI_NATIVE(prehandlePause)(env, thiz);
         else
-            VI_SOAK_NATIVE(prehandleStop)(env, thiz);
+            VI_NATIVE(prehandleStop)(env, thiz);
         if (!jni.misuses().empty()) {
             std::printf("cycles: JNI misuse: %s\n", jni.misuses().front().c_str());
             return 1;

@@ -1,99 +1,231 @@
-// The soak: random sequences of host calls played into the runtime, built
-// with the address and undefined-behaviour sanitizers, every invariant
-// checked after every call. See soak/README.md.
+// The soak: random sequences of host calls, each played in a child process of
+// its own into the runtime built with the sanitizers; this process, which
+// never touches GL, watches. A fault is a crash, a sanitizer report, a hang
+// (no end within the time limit), or a failed check of the player; the
+// failing sequence is then shrunk to a short reproduction. See soak/README.md.
 //
-//   vi_soak [--seed N] [--sequences N] [--minutes M] [--avoid-...]
-//   vi_soak --seed N --replay SEQUENCE[:i,j,k] [--replay ...] [--avoid-...]
-#include <fcntl.h>
+//   vi_soak [--seed N] [--sequences N] [--minutes M]
+//   vi_soak --seed N --replay SEQUENCE[:i,j,k]
+#include <signal.h>
+#include <sys/mman.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
+#include <random>
 #include <string>
 
-#include "Supervisor.h"
+#include "Player.h"
 
 namespace {
 
-std::uint64_t randomSeed() {
-    std::uint64_t seed = 0;
-    const int file = open("/dev/urandom", O_RDONLY);
-    if (file >= 0) {
-        if (read(file, &seed, sizeof(seed)) != ssize_t(sizeof(seed))) seed = 0;
-        close(file);
-    }
-    return seed ? seed % 1000000000000ull : std::uint64_t(time(nullptr));
+using visoak::Player;
+
+const double kSequenceSeconds = 60.0;
+const int kMaxReplays = 300;
+const double kShrinkSeconds = 180.0;
+const int kHang = -1;
+
+// Written by the child, read by this process once the child has ended.
+struct Progress {
+    int call;  // the call being played
+    long calls, losses, compared;
+};
+Progress* gProgress;
+
+double seconds() {
+    return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
 }
 
-std::vector<int> parseList(const char* text) {
-    std::vector<int> values;
-    const char* p = text;
-    while (*p) {
-        char* end = nullptr;
-        values.push_back(int(std::strtol(p, &end, 10)));
-        if (end == p) break;
-        p = *end == ',' ? end + 1 : end;
+// Plays sequence `index`, or only the calls `only` of it; the exit status.
+int play(std::uint64_t seed, int index, const std::vector<int>& only, bool verbose) {
+    const std::vector<visoak::Call> calls = visoak::makeSequence(seed, index);
+    std::vector<int> order = only;
+    for (int i = 0; only.empty() && i < int(calls.size()); ++i) order.push_back(i);
+    Player player;
+    for (int i : order) {
+        if (i < 0 || i >= int(calls.size())) continue;
+        gProgress->call = i;
+        if (verbose) std::printf("  %3d: %s\n", i, visoak::describe(calls[std::size_t(i)]).c_str());
+        std::string fault;
+        const Player::Outcome outcome = player.play(calls[std::size_t(i)], fault);
+        if (outcome == Player::Skipped && verbose) std::printf("       skipped: not a call a host makes now\n");
+        if (outcome == Player::Skipped) continue;
+        ++gProgress->calls;
+        gProgress->losses += calls[std::size_t(i)].kind == visoak::CallContextLoss;
+        gProgress->compared = player.compared();
+        if (outcome != Player::Played) {
+            std::printf("soak: sequence %d, call %d: %s\n", index, i, fault.c_str());
+            return outcome == Player::FrameDiffers ? 3 : 4;
+        }
     }
-    return values;
+    return 0;
+}
+
+// Plays in a fresh child within the time limit; its exit status, kHang, or
+// 128 + the signal that ended it.
+int inChild(std::uint64_t seed, int index, const std::vector<int>& only, bool quiet) {
+    *gProgress = Progress{-1, 0, 0, 0};
+    std::fflush(stdout);
+    const pid_t pid = fork();
+    if (pid == 0) {
+        if (quiet && (!std::freopen("/dev/null", "w", stdout) || !std::freopen("/dev/null", "w", stderr))) _exit(2);
+        std::exit(play(seed, index, only, false));  // exit, not _exit: the leak checker looks at what is left
+    }
+    sigset_t childEnded;
+    sigemptyset(&childEnded);
+    sigaddset(&childEnded, SIGCHLD);
+    const double deadline = seconds() + kSequenceSeconds;
+    int status = 0;
+    while (waitpid(pid, &status, WNOHANG) == 0) {
+        const double left = deadline - seconds();
+        if (left <= 0) {
+            kill(pid, SIGKILL);
+            waitpid(pid, &status, 0);
+            return kHang;
+        }
+        const timespec wait = {time_t(left), long((left - double(time_t(left))) * 1e9)};
+        sigtimedwait(&childEnded, nullptr, &wait);
+    }
+    return WIFSIGNALED(status) ? 128 + WTERMSIG(status) : WEXITSTATUS(status);
+}
+
+std::string faultOf(int status) {
+    switch (status) {
+        case kHang: return "no end within " + std::to_string(int(kSequenceSeconds)) + " s (a hang)";
+        case 1: return "exit status 1 (a sanitizer report above)";
+        case 3: return "a frame after a context change differs from the frame before it";
+        case 4: return "a JNI misuse";
+        case 23: return "exit status 23 (a leak report above)";
+        default:
+            return status > 128 ? "killed by signal " + std::to_string(status - 128)
+                                : "exit status " + std::to_string(status);
+    }
+}
+
+std::string joined(const std::vector<int>& calls) {
+    std::string list;
+    for (int i : calls) list += (list.empty() ? "" : ",") + std::to_string(i);
+    return list;
+}
+
+// Delta debugging: drops chunks of calls, halving the chunk size when none can
+// go, while the rest still fails the same way in a fresh child.
+void shrink(std::uint64_t seed, int index, int failingCall, int status) {
+    std::vector<int> calls;
+    const int size = int(visoak::makeSequence(seed, index).size());
+    for (int i = 0; i < size && (failingCall < 0 || i <= failingCall); ++i) calls.push_back(i);
+    const double deadline = seconds() + kShrinkSeconds;
+    int replays = 0;
+    auto fails = [&](const std::vector<int>& candidate) {
+        ++replays;
+        return inChild(seed, index, candidate, true) == status;
+    };
+    std::printf("soak: shrinking %zu calls...\n", calls.size());
+    if (!fails(calls)) {
+        for (int i = int(calls.size()); i < size; ++i) calls.push_back(i);
+        if (!fails(calls)) {
+            std::printf("soak: the sequence does not fail again from a fresh start\n");
+            return;
+        }
+    }
+    for (std::size_t chunk = calls.size() / 2; chunk >= 1 && replays < kMaxReplays && seconds() < deadline;) {
+        bool dropped = false;
+        for (std::size_t start = 0; start < calls.size() && replays < kMaxReplays && seconds() < deadline;) {
+            std::vector<int> candidate(calls.begin(), calls.begin() + long(start));
+            candidate.insert(candidate.end(), calls.begin() + long(std::min(start + chunk, calls.size())), calls.end());
+            if (!candidate.empty() && fails(candidate)) {
+                calls = candidate;
+                dropped = true;
+            } else {
+                start += chunk;
+            }
+        }
+        chunk = dropped ? std::min(chunk, std::max<std::size_t>(calls.size() / 2, 1)) : chunk / 2;
+    }
+    const std::vector<visoak::Call> sequence = visoak::makeSequence(seed, index);
+    std::printf("soak: reproduction (%zu calls, after %d replays), seed %llu, sequence %d:\n", calls.size(), replays,
+                (unsigned long long)seed, index);
+    for (int i : calls) std::printf("  %3d: %s\n", i, visoak::describe(sequence[std::size_t(i)]).c_str());
+    std::printf("soak: replay it with: scripts/soak soak --seed %llu --replay %d:%s\n", (unsigned long long)seed, index,
+                joined(calls).c_str());
 }
 
 int usage() {
-    std::fprintf(stderr,
-                 "usage: vi_soak [--seed N] [--sequences N] [--minutes M] [--avoid-...]\n"
-                 "       vi_soak --seed N --replay SEQUENCE[:i,j,k] [--replay ...] [--avoid-...]\n"
-                 "  --avoid-replace-before-first-upload: leave out loading a name again before its first\n"
-                 "    allocation\n"
-                 "  --avoid-init-after-context-change: leave out initialising after a context change and\n"
-                 "    before the next frame (the default: the runtime does not check the context there)\n"
-                 "  --with-init-after-context-change: keep that pattern in (it is expected to fault)\n");
+    std::fprintf(stderr, "usage: vi_soak [--seed N] [--sequences N] [--minutes M]\n"
+                         "       vi_soak --seed N --replay SEQUENCE[:i,j,k]\n");
     return 2;
 }
 
 }  // namespace
 
 int main(int argc, char** argv) {
-    visoak::SoakOptions options;
-    // Initialising before the first frame after a context change meets stale
-    // program names by the runtime's own rules (the context is checked only where
-    // it checks it), so the default run leaves that host pattern out.
-    options.avoid.initAfterContextChange = true;
+    std::uint64_t seed = std::random_device()() % 1000000;
+    long sequences = 1000000;
+    double minutes = 3.5;
+    std::string replay;
     bool seedGiven = false;
-    for (int i = 1; i < argc; ++i) {
-        const std::string argument = argv[i];
-        const bool hasValue = i + 1 < argc;
-        if (argument == "--seed" && hasValue) {
-            options.seed = std::strtoull(argv[++i], nullptr, 10);
+    for (int i = 1; i + 1 < argc; i += 2) {
+        const std::string option = argv[i];
+        if (option == "--seed") {
+            seed = std::strtoull(argv[i + 1], nullptr, 10);
             seedGiven = true;
-        } else if (argument == "--sequences" && hasValue) {
-            options.sequences = std::strtol(argv[++i], nullptr, 10);
-        } else if (argument == "--minutes" && hasValue) {
-            options.minutes = std::strtod(argv[++i], nullptr);
-        } else if (argument == "--replay" && hasValue) {
-            // SEQUENCE or SEQUENCE:i,j,k
-            const std::string value = argv[++i];
-            visoak::SequencePart part;
-            part.sequence = std::atoi(value.c_str());
-            const std::string::size_type colon = value.find(':');
-            if (colon != std::string::npos) part.calls = parseList(value.c_str() + colon + 1);
-            options.replay.push_back(part);
-        } else if (argument == "--avoid-replace-before-first-upload") {
-            options.avoid.replaceBeforeFirstUpload = true;
-        } else if (argument == "--avoid-init-after-context-change") {
-            options.avoid.initAfterContextChange = true;
-        } else if (argument == "--with-init-after-context-change") {
-            options.avoid.initAfterContextChange = false;
+        } else if (option == "--sequences") {
+            sequences = std::strtol(argv[i + 1], nullptr, 10);
+        } else if (option == "--minutes") {
+            minutes = std::strtod(argv[i + 1], nullptr);
+        } else if (option == "--replay") {
+            replay = argv[i + 1];
         } else {
             return usage();
         }
     }
-    if (!seedGiven) options.seed = randomSeed();
-    if (!options.replay.empty() && !seedGiven) return usage();
-
-    options.paths.soak = VI_SOAK_SCENE_PLUGIN;
-    options.paths.test = VI_SOAK_TEST_PLUGIN;
-    options.paths.noFactory = VI_SOAK_NOFACTORY_PLUGIN;
-    options.paths.missing = "/nonexistent/libmissing-effect.so";
+    if (argc % 2 == 0 || (!replay.empty() && !seedGiven)) return usage();
     setvbuf(stdout, nullptr, _IOLBF, 0);
-    return options.replay.empty() ? visoak::superviseSoak(options) : visoak::replaySequences(options);
+    gProgress = static_cast<Progress*>(
+        mmap(nullptr, sizeof(Progress), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0));
+
+    if (!replay.empty()) {
+        // SEQUENCE or SEQUENCE:i,j,k, played in this process, each call printed.
+        std::vector<int> only;
+        const std::size_t colon = replay.find(':');
+        for (std::size_t at = colon; at != std::string::npos; at = replay.find(',', at + 1))
+            only.push_back(std::atoi(replay.c_str() + at + 1));
+        std::printf("soak: replaying sequence %d of seed %llu\n", std::atoi(replay.c_str()), (unsigned long long)seed);
+        const int status = play(seed, std::atoi(replay.c_str()), only, true);
+        std::printf("soak: %s\n", status ? "the replay failed" : "the replay passed");
+        return status;
+    }
+
+    // SIGCHLD stays pending for sigtimedwait.
+    sigset_t childEnded;
+    sigemptyset(&childEnded);
+    sigaddset(&childEnded, SIGCHLD);
+    sigprocmask(SIG_BLOCK, &childEnded, nullptr);
+    std::printf("soak: seed %llu, at most %ld sequences in %.1f minutes\n", (unsigned long long)seed, sequences, minutes);
+    const double started = seconds();
+    const double deadline = started + minutes * 60.0;
+    long played = 0, calls = 0, losses = 0, compared = 0, faults = 0;
+    for (int index = 0; index < sequences && seconds() < deadline; ++index) {
+        const int status = inChild(seed, index, {}, false);
+        ++played;
+        calls += gProgress->calls;
+        losses += gProgress->losses;
+        compared += gProgress->compared;
+        if (status == 0) continue;
+        ++faults;
+        const int call = gProgress->call;
+        std::printf("soak: FAULT with seed %llu in sequence %d at call %d: %s\n", (unsigned long long)seed, index, call,
+                    faultOf(status).c_str());
+        shrink(seed, index, call, status);
+        break;
+    }
+    std::printf("soak: %ld frames after a context change equal to the frame before it, %.0f s\n", compared - faults,
+                seconds() - started);
+    std::printf("soak: %ld sequences, %ld calls, %ld context losses, %ld fault%s\n", played, calls, losses, faults,
+                faults == 1 ? "" : "s");
+    return faults ? 1 : 0;
 }

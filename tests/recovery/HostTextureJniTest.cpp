@@ -1,4 +1,4 @@
-// The host's texture loading seen from a stand-in JNI environment: which JNI
+// The host's texture loading seen from the JNI stand-in: which JNI
 // functions it calls and in what order relative to the context check and the
 // GL upload, that the application lock is never held, and what the replace
 // path does in what order; unloading. Freed buffers are logged with the GL calls (the
@@ -16,13 +16,11 @@
 
 #include "Application/ApplicationVar.h"
 #include "Application/ContextRecovery.h"
+#include "FakeJni.h"
 #include "GlContext.h"
 #include "GlRecorder.h"
 #include "Render/Renderer.h"
 #include "Render/Texture.h"
-
-extern "C" JNIEXPORT void JNICALL Java_com_tarq_android_visualeffect_common_Native_loadTexture(
-    JNIEnv* env, jclass, jstring name, jintArray pixels, jint width, jint height);
 
 extern "C" void __real_free(void* p);
 extern "C" void __wrap_free(void* p) {
@@ -41,51 +39,13 @@ double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p
 
 // Logged with the GL calls; every JNI call also checks that the lock is free.
 bool gLockWasHeld = false;
-void logJni(const char* name, std::initializer_list<double> args = {}) {
+void logJni(const char* function) {
     if (pthread_mutex_trylock(&vi::ApplicationVar::msCriticalSection) == 0)
         pthread_mutex_unlock(&vi::ApplicationVar::msCriticalSection);
     else
         gLockWasHeld = true;
-    GlRecorder::record(name, args);
+    GlRecorder::record(function, {});
 }
-
-// A jstring is the name's characters, a jintArray the host's ints themselves.
-const char* JNICALL getStringUTFChars(JNIEnv*, jstring name, jboolean*) {
-    logJni("GetStringUTFChars");
-    return reinterpret_cast<const char*>(name);
-}
-void JNICALL releaseStringUTFChars(JNIEnv*, jstring, const char* chars) {
-    logJni("ReleaseStringUTFChars", {address(chars)});
-}
-jint* JNICALL getIntArrayElements(JNIEnv*, jintArray array, jboolean*) {
-    logJni("GetIntArrayElements");
-    return reinterpret_cast<jint*>(array);
-}
-void JNICALL releaseIntArrayElements(JNIEnv*, jintArray, jint* elements, jint mode) {
-    logJni("ReleaseIntArrayElements", {address(elements), double(mode)});
-}
-
-// Only the four functions the loading may use; any other call crashes the test.
-class StandInJni {
-public:
-    StandInJni() : mTable() {
-        mTable.GetStringUTFChars = getStringUTFChars;
-        mTable.ReleaseStringUTFChars = releaseStringUTFChars;
-        mTable.GetIntArrayElements = getIntArrayElements;
-        mTable.ReleaseIntArrayElements = releaseIntArrayElements;
-        mEnv.functions = &mTable;
-    }
-
-    void load(const char* name, std::vector<jint>* pixels, int width, int height) {
-        Java_com_tarq_android_visualeffect_common_Native_loadTexture(
-            &mEnv, nullptr, reinterpret_cast<jstring>(const_cast<char*>(name)),
-            pixels ? reinterpret_cast<jintArray>(pixels->data()) : nullptr, width, height);
-    }
-
-private:
-    JNINativeInterface_ mTable;
-    JNIEnv mEnv;
-};
 
 class CountingScene : public vi::Scene {
 public:
@@ -101,9 +61,12 @@ protected:
         vi::ContextRecovery::invalidate();
         gLockWasHeld = false;
         vi::gpScene = &scene;
+        jni.setObserver(logJni);
     }
 
     void TearDown() override {
+        EXPECT_TRUE(jni.misuses().empty());
+        EXPECT_EQ(0, jni.outstandingUtfChars() + jni.outstandingElements()) << "JNI copies not released";
         vi::gpScene = nullptr;
         for (const std::string& name : loaded) {
             delete vi::ApplicationVar::msTexturesMap[name];
@@ -117,15 +80,22 @@ protected:
         return vi::ApplicationVar::msTexturesMap[name];
     }
 
+    // The host's call: a name and its pixels (none: an unload).
+    void load(const char* name, const std::vector<jint>* pixels, int width, int height) {
+        VI_NATIVE(loadTexture)(jni.env(), nullptr, jni.string(name), pixels ? jni.intArray(*pixels) : nullptr,
+                               width, height);
+        jni.reset();
+    }
+
     std::unique_ptr<GlContext> context;
-    StandInJni jni;
+    vitest::FakeJni jni;
     CountingScene scene;
     std::vector<std::string> loaded;
 };
 
 TEST_F(HostLoading, ReplaceFreesThenUploadsAtTheNewSizeThenTellsTheSceneWithoutTheLock) {
     std::vector<jint> small = {1, 2};
-    jni.load("replaced", &small, 2, 1);
+    load("replaced", &small, 2, 1);
     vi::Texture* texture = filed("replaced");
     texture->allocate();  // as the scene would, before binding it
     void* const firstBuffer = texture->mBuffer;
@@ -133,7 +103,7 @@ TEST_F(HostLoading, ReplaceFreesThenUploadsAtTheNewSizeThenTellsTheSceneWithoutT
 
     std::vector<jint> large(6, jint(0xFF102030u));
     GlRecording recording;
-    jni.load("replaced", &large, 3, 2);
+    load("replaced", &large, 3, 2);
     EXPECT_EQ(texture, vi::ApplicationVar::msTexturesMap["replaced"]);
     EXPECT_EQ((std::vector<std::string>{"eglGetCurrentContext", "GetStringUTFChars", "GetIntArrayElements", "free",
                                         "glBindTexture", "glTexImage2D", "textureUpdated",
@@ -155,9 +125,9 @@ TEST_F(HostLoading, ReplaceFreesThenUploadsAtTheNewSizeThenTellsTheSceneWithoutT
 // first allocation must still define the storage in full and show the new pixels.
 TEST_F(HostLoading, ReplaceBeforeTheFirstAllocationStillShowsTheNewPixelsOnceAllocated) {
     std::vector<jint> first = {jint(0xFF0000FFu)};
-    jni.load("early", &first, 1, 1);
+    load("early", &first, 1, 1);
     std::vector<jint> second(4, jint(0xFF00FF00u));
-    jni.load("early", &second, 2, 2);
+    load("early", &second, 2, 2);
     vi::Texture* texture = filed("early");
     ASSERT_EQ(0u, texture->mId);
 
@@ -172,16 +142,16 @@ TEST_F(HostLoading, ReplaceBeforeTheFirstAllocationStillShowsTheNewPixelsOnceAll
 // Unloading a name never loaded files a null entry that a later load fills;
 // unloading a loaded one deletes the texture and leaves the stale pointer filed.
 TEST_F(HostLoading, UnloadFilesANullEntryOrKeepsTheStalePointer) {
-    jni.load("later", nullptr, 4, 4);
+    load("later", nullptr, 4, 4);
     ASSERT_EQ(1u, vi::ApplicationVar::msTexturesMap.count("later"));
     EXPECT_EQ(nullptr, vi::ApplicationVar::msTexturesMap["later"]);
     std::vector<jint> pixels = {jint(0x7F123456u)};
-    jni.load("later", &pixels, 1, 1);
+    load("later", &pixels, 1, 1);
     vi::Texture* texture = vi::ApplicationVar::msTexturesMap["later"];
     ASSERT_NE(nullptr, texture);
     EXPECT_EQ(1u, vi::Texture::mAllTextures.size());
 
-    jni.load("later", nullptr, 1, 1);
+    load("later", nullptr, 1, 1);
     EXPECT_TRUE(vi::Texture::mAllTextures.empty()) << "the texture is deleted";
     EXPECT_EQ(texture, vi::ApplicationVar::msTexturesMap["later"]) << "the entry keeps the old pointer";
     vi::ApplicationVar::msTexturesMap.erase("later");

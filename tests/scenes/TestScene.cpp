@@ -1,5 +1,6 @@
 // The recording scene. Every operation notes itself with the scene members it
 // sees; an atomic flag notices a call that begins while another is running.
+#include <EGL/egl.h>
 #include <GLES2/gl2.h>
 
 #include <atomic>
@@ -9,6 +10,8 @@
 
 #include "Application/AnimationManager.h"
 #include "Application/Scene.h"
+#include "Render/Background.h"
+#include "Render/Texture.h"
 #include "TestSceneRecord.h"
 
 namespace {
@@ -18,6 +21,7 @@ struct Config {
     int drawResult = 0;
     int initialOrientation = 0;
     bool clear = false;
+    bool picture = false;
     float clearColour[4] = {0.0f, 0.0f, 0.0f, 0.0f};
 };
 
@@ -43,7 +47,8 @@ public:
 
 class RecordingScene : public vi::Scene {
 public:
-    RecordingScene(const int* size, int factory) : vi::Scene(size), mSerial(++gSerial), mFactory(factory) {
+    RecordingScene(const int* size, vi::TexturesMap* textures, int factory)
+        : vi::Scene(size), mSerial(++gSerial), mFactory(factory), mTextures(textures), mPicture(nullptr) {
         mOrientation = static_cast<vi::Orientation::OrientationEnum>(gConfig.initialOrientation);
         mNames = gConfig.names;
         record(TestSceneCreated, size[0], size[1]);
@@ -51,6 +56,7 @@ public:
     ~RecordingScene() override {
         Inside inside;
         record(TestSceneDestroyed);
+        delete mPicture;
     }
 
     void clearEffect() override { note(TestSceneClearEffect); }
@@ -66,6 +72,7 @@ public:
             glClearColor(gConfig.clearColour[0], gConfig.clearColour[1], gConfig.clearColour[2], gConfig.clearColour[3]);
             glClear(GL_COLOR_BUFFER_BIT);
         }
+        if (gConfig.picture) drawPicture();
         return gConfig.drawResult;
     }
     void touchDown(const glm::vec2& position) override { noteTouch(TestSceneTouchDown, position); }
@@ -81,6 +88,17 @@ public:
     }
 
 private:
+    // Made in the first frame with a context and the image filed, so that its
+    // GL names come from a frame the runtime has checked the context for. Left
+    // out while the image has no client pixels: recycled, it may come back
+    // from a lost context undefined.
+    void drawPicture() {
+        if (!mPicture && !mNames.empty() && eglGetCurrentContext() != EGL_NO_CONTEXT) {
+            auto filed = mTextures->find(mNames[0]);
+            if (filed != mTextures->end() && filed->second) mPicture = new vi::Background(*filed->second);
+        }
+        if (mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
+    }
     void note(int kind) {
         Inside inside;
         record(kind);
@@ -113,13 +131,15 @@ private:
 
     int mSerial;
     int mFactory;
+    vi::TexturesMap* mTextures;
+    vi::Background* mPicture;
 };
 
 vi::Scene* create(int* size, vi::ModelsMap* models, vi::TexturesMap* textures, int factory) {
     Inside inside;
     gLastModels = models;
     gLastTextures = textures;
-    return new RecordingScene(size, factory);
+    return new RecordingScene(size, textures, factory);
 }
 
 }  // namespace
@@ -161,6 +181,8 @@ void testSceneSetClearColour(int enabled, float red, float green, float blue, fl
     gConfig.clearColour[2] = blue;
     gConfig.clearColour[3] = alpha;
 }
+
+void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
 
 int testSceneEventCount(void) { return int(gEvents.size()); }
 TestSceneEvent testSceneEventAt(int index) {

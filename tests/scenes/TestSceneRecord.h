@@ -54,7 +54,7 @@ struct TestSceneEvent {
 };
 
 // Forgets every event and the overlap count, and restores the defaults: no
-// names, draw result 0, initial orientation 0, no clearing.
+// names, draw result 0, initial orientation 0, no clearing, no picture.
 TESTSCENE_API void testSceneReset(void);
 // Forgets the events, counts and overlaps only; the configuration and the
 // serial numbers of scenes go on.
@@ -64,6 +64,9 @@ TESTSCENE_API void testSceneSetDrawResult(int result);
 TESTSCENE_API void testSceneSetInitialOrientation(int orientation);
 // When enabled, draw clears the colour buffer of the current context.
 TESTSCENE_API void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha);
+// When enabled, draw then shows the host's image filed under the scene's first
+// name over the whole frame (while it has client pixels).
+TESTSCENE_API void testSceneSetPicture(int enabled);
 
 TESTSCENE_API int testSceneEventCount(void);
 TESTSCENE_API struct TestSceneEvent testSceneEventAt(int index);

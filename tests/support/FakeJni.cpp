@@ -1,10 +1,9 @@
 #include "FakeJni.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <cstring>
 
-namespace visoak {
+namespace vitest {
 
 namespace {
 
@@ -20,10 +19,9 @@ struct FakeJni::Object {
     std::string elementClass;      // kObjectArray
 };
 
-FakeJni::FakeJni() : mThis(0) {
+FakeJni::FakeJni() : mThis(0), mObserver(nullptr) {
     std::memset(&mTable, 0, sizeof(mTable));
-    // The JNI function table is reached through env->functions; the slots
-    // not filled stay null.
+    // The table is reached through env->functions; the slots not filled stay null.
     mTable.reserved0 = this;
     mTable.GetStringUTFChars = getStringUtfChars;
     mTable.ReleaseStringUTFChars = releaseStringUtfChars;
@@ -37,11 +35,15 @@ FakeJni::FakeJni() : mThis(0) {
 }
 
 FakeJni::~FakeJni() {
-    dropOutstandingUtfChars();
-    for (const Lease& lease : mElements) std::free(const_cast<void*>(lease.pointer));
+    for (const Lease& lease : mUtfChars) delete[] static_cast<const char*>(lease.pointer);
+    for (const Lease& lease : mElements) delete[] static_cast<const jint*>(lease.pointer);
 }
 
-FakeJni& FakeJni::self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
+FakeJni& FakeJni::self(JNIEnv* env, const char* function) {
+    FakeJni& jni = *static_cast<FakeJni*>(env->functions->reserved0);
+    if (jni.mObserver) jni.mObserver(function);
+    return jni;
+}
 
 FakeJni::Object* FakeJni::make(int kind) {
     mObjects.emplace_back(new Object());
@@ -67,11 +69,6 @@ jintArray FakeJni::intArray(const std::vector<jint>& values) {
     return reinterpret_cast<jintArray>(object);
 }
 
-std::vector<jint> FakeJni::intArrayValues(jintArray array) const {
-    Object* found = object(array, kIntArray);
-    return found ? found->ints : std::vector<jint>();
-}
-
 bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& values) const {
     Object* found = object(array, kObjectArray);
     if (!found || found->elementClass != "java/lang/String") return false;
@@ -83,14 +80,9 @@ bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& va
     return true;
 }
 
-void FakeJni::dropOutstandingUtfChars() {
-    for (const Lease& lease : mUtfChars) std::free(const_cast<void*>(lease.pointer));
-    mUtfChars.clear();
-}
-
 void FakeJni::reset() {
-    // Outstanding leases keep their objects' memory out of the way: only the
-    // handles die, as a JVM's local references do at the end of a native call.
+    // Objects with elements still handed out stay, so that a late release
+    // finds its owner; only the handles die, as local references do.
     mObjects.erase(std::remove_if(mObjects.begin(), mObjects.end(),
                                   [this](const std::unique_ptr<Object>& owned) {
                                       for (const Lease& lease : mElements)
@@ -101,13 +93,13 @@ void FakeJni::reset() {
 }
 
 const char* FakeJni::getStringUtfChars(JNIEnv* env, jstring string, jboolean* isCopy) {
-    FakeJni& jni = self(env);
+    FakeJni& jni = self(env, "GetStringUTFChars");
     Object* found = jni.object(string, kString);
     if (!found) {
         jni.mMisuses.push_back("GetStringUTFChars of something not a string");
         return nullptr;
     }
-    char* chars = static_cast<char*>(std::malloc(found->text.size() + 1));
+    char* chars = new char[found->text.size() + 1];
     std::memcpy(chars, found->text.c_str(), found->text.size() + 1);
     jni.mUtfChars.push_back(Lease{chars, found});
     if (isCopy) *isCopy = JNI_TRUE;
@@ -115,34 +107,34 @@ const char* FakeJni::getStringUtfChars(JNIEnv* env, jstring string, jboolean* is
 }
 
 void FakeJni::releaseStringUtfChars(JNIEnv* env, jstring string, const char* chars) {
-    FakeJni& jni = self(env);
+    FakeJni& jni = self(env, "ReleaseStringUTFChars");
     auto lease = std::find_if(jni.mUtfChars.begin(), jni.mUtfChars.end(),
                               [chars](const Lease& l) { return l.pointer == chars; });
     if (lease == jni.mUtfChars.end() || lease->owner != jni.object(string, kString)) {
         jni.mMisuses.push_back("ReleaseStringUTFChars of chars not handed out for that string");
         return;
     }
-    std::free(const_cast<char*>(chars));
+    delete[] chars;
     jni.mUtfChars.erase(lease);
 }
 
 jint* FakeJni::getIntArrayElements(JNIEnv* env, jintArray array, jboolean* isCopy) {
-    FakeJni& jni = self(env);
+    FakeJni& jni = self(env, "GetIntArrayElements");
     Object* found = jni.object(array, kIntArray);
     if (!found) {
         jni.mMisuses.push_back("GetIntArrayElements of something not an int array");
         return nullptr;
     }
     // At least one element, so that an empty array still gives a distinct lease.
-    jint* elements = static_cast<jint*>(std::malloc(std::max<std::size_t>(found->ints.size(), 1) * sizeof(jint)));
-    if (!found->ints.empty()) std::memcpy(elements, found->ints.data(), found->ints.size() * sizeof(jint));
+    jint* elements = new jint[std::max<std::size_t>(found->ints.size(), 1)];
+    std::copy(found->ints.begin(), found->ints.end(), elements);
     jni.mElements.push_back(Lease{elements, found});
     if (isCopy) *isCopy = JNI_TRUE;
     return elements;
 }
 
 void FakeJni::releaseIntArrayElements(JNIEnv* env, jintArray array, jint* elements, jint mode) {
-    FakeJni& jni = self(env);
+    FakeJni& jni = self(env, "ReleaseIntArrayElements");
     auto lease = std::find_if(jni.mElements.begin(), jni.mElements.end(),
                               [elements](const Lease& l) { return l.pointer == elements; });
     if (lease == jni.mElements.end() || lease->owner != jni.object(array, kIntArray)) {
@@ -150,27 +142,23 @@ void FakeJni::releaseIntArrayElements(JNIEnv* env, jintArray array, jint* elemen
         return;
     }
     Object* owner = lease->owner;
-    if ((mode == 0 || mode == JNI_COMMIT) && !owner->ints.empty())
-        std::memcpy(owner->ints.data(), elements, owner->ints.size() * sizeof(jint));
+    if (mode == 0 || mode == JNI_COMMIT) std::copy(elements, elements + owner->ints.size(), owner->ints.begin());
     if (mode == 0 || mode == JNI_ABORT) {
-        std::free(elements);
+        delete[] elements;
         jni.mElements.erase(lease);
     }
 }
 
 jclass FakeJni::findClass(JNIEnv* env, const char* name) {
-    FakeJni& jni = self(env);
-    Object* object = jni.make(kClass);
+    Object* object = self(env, "FindClass").make(kClass);
     object->text = name;
     return reinterpret_cast<jclass>(object);
 }
 
-jstring FakeJni::newStringUtf(JNIEnv* env, const char* chars) {
-    return self(env).string(chars);
-}
+jstring FakeJni::newStringUtf(JNIEnv* env, const char* chars) { return self(env, "NewStringUTF").string(chars); }
 
 jobjectArray FakeJni::newObjectArray(JNIEnv* env, jsize length, jclass elementClass, jobject initial) {
-    FakeJni& jni = self(env);
+    FakeJni& jni = self(env, "NewObjectArray");
     Object* type = jni.object(elementClass, kClass);
     if (!type || length < 0) {
         jni.mMisuses.push_back("NewObjectArray without a class or with a negative length");
@@ -183,7 +171,7 @@ jobjectArray FakeJni::newObjectArray(JNIEnv* env, jsize length, jclass elementCl
 }
 
 void FakeJni::setObjectArrayElement(JNIEnv* env, jobjectArray array, jsize index, jobject value) {
-    FakeJni& jni = self(env);
+    FakeJni& jni = self(env, "SetObjectArrayElement");
     Object* found = jni.object(array, kObjectArray);
     if (!found || index < 0 || std::size_t(index) >= found->objects.size()) {
         jni.mMisuses.push_back("SetObjectArrayElement outside the array");
@@ -192,4 +180,4 @@ void FakeJni::setObjectArrayElement(JNIEnv* env, jobjectArray array, jsize index
     found->objects[std::size_t(index)] = static_cast<Object*>(static_cast<void*>(value));
 }
 
-}  // namespace visoak
+}  // namespace vitest
