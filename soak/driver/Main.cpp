@@ -32,7 +32,7 @@ const int kHang = -1;
 // Written by the child, read by this process once the child has ended.
 struct Progress {
     int call;  // the call being played
-    long calls, losses, compared;
+    long calls, losses, equalFrames;
 };
 Progress* gProgress;
 
@@ -56,7 +56,7 @@ int play(std::uint64_t seed, int index, const std::vector<int>& only, bool verbo
         if (outcome == Player::Skipped) continue;
         ++gProgress->calls;
         gProgress->losses += calls[std::size_t(i)].kind == visoak::CallContextLoss;
-        gProgress->compared = player.compared();
+        gProgress->equalFrames = player.equalFrames();
         if (outcome != Player::Played) {
             std::printf("soak: sequence %d, call %d: %s\n", index, i, fault.c_str());
             return outcome == Player::FrameDiffers ? 3 : 4;
@@ -208,13 +208,13 @@ int main(int argc, char** argv) {
     std::printf("soak: seed %llu, at most %ld sequences in %.1f minutes\n", (unsigned long long)seed, sequences, minutes);
     const double started = seconds();
     const double deadline = started + minutes * 60.0;
-    long played = 0, calls = 0, losses = 0, compared = 0, faults = 0;
+    long played = 0, calls = 0, losses = 0, equalFrames = 0, faults = 0;
     for (int index = 0; index < sequences && seconds() < deadline; ++index) {
         const int status = inChild(seed, index, {}, false);
         ++played;
         calls += gProgress->calls;
         losses += gProgress->losses;
-        compared += gProgress->compared;
+        equalFrames += gProgress->equalFrames;
         if (status == 0) continue;
         ++faults;
         const int call = gProgress->call;
@@ -223,7 +223,7 @@ int main(int argc, char** argv) {
         shrink(seed, index, call, status);
         break;
     }
-    std::printf("soak: %ld frames after a context change equal to the frame before it, %.0f s\n", compared - faults,
+    std::printf("soak: %ld frames after a context change equal to the frame before it, %.0f s\n", equalFrames,
                 seconds() - started);
     std::printf("soak: %ld sequences, %ld calls, %ld context losses, %ld fault%s\n", played, calls, losses, faults,
                 faults == 1 ? "" : "s");

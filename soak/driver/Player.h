@@ -35,8 +35,8 @@ public:
     ~Player();
 
     Outcome play(const Call& call, std::string& fault);
-    // Frames compared with the frame before a context change.
-    long compared() const { return mCompared; }
+    // Frames after a context change found equal to the frame before it.
+    long equalFrames() const { return mEqualFrames; }
 
 private:
     enum Context { ContextMain, ContextSecond, ContextNone };
@@ -58,7 +58,7 @@ private:
     std::set<std::string> mLoaded;
     int mGeneration[2];             // of the picture's and the other images' names
     std::vector<std::uint8_t> mBeforeChange;
-    long mCompared;
+    long mEqualFrames;
 };
 
 }  // namespace visoak
