@@ -10,12 +10,9 @@
 // purpose, which soak/lsan.supp names.
 //
 //   vi_soak_cycles [--cycles N] [--sample PATH]
-#include <sys/resource.h>
-
 #include <array>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 #include <string>
 #include <vector>
 
@@ -42,18 +39,6 @@ Sizes sizes() {
                  vi::AnimationManager::mStorage.size()};
 }
 
-void print(const char* when, const Sizes& s) {
-    std::printf("cycles: %s: %zu renderers, %zu textures registered; %zu textures and %zu models filed; "
-                "%zu animations\n",
-                when, s[0], s[1], s[2], s[3], s[4]);
-}
-
-long residentKilobytes() {
-    rusage usage;
-    getrusage(RUSAGE_SELF, &usage);
-    return usage.ru_maxrss;
-}
-
 std::vector<jint> wallpaper(int cycle, int width, int height) {
     std::vector<jint> pixels(std::size_t(width) * height);
     for (int i = 0; i < width * height; ++i) pixels[std::size_t(i)] = jint(0xFF000000u | unsigned(i * 2654435761u + unsigned(cycle)) >> 8);
@@ -66,15 +51,11 @@ int main(int argc, char** argv) {
     int cycles = 10000;
     std::string sample = VI_CYCLES_SAMPLE_PLUGIN;
     std::string noFactory = VI_CYCLES_NOFACTORY_PLUGIN;
-    for (int i = 1; i + 1 < argc; i += 2) {
-        if (std::strcmp(argv[i], "--cycles") == 0)
-            cycles = std::atoi(argv[i + 1]);
-        else if (std::strcmp(argv[i], "--sample") == 0)
-            sample = argv[i + 1];
-        else {
-            std::fprintf(stderr, "usage: vi_soak_cycles [--cycles N] [--sample PATH]\n");
-            return 2;
-        }
+    for (int i = 1; i < argc; i += 2) {
+        const std::string option = argv[i];
+        if (i + 1 < argc && option == "--cycles") cycles = std::atoi(argv[i + 1]);
+        else if (i + 1 < argc && option == "--sample") sample = argv[i + 1];
+        else return std::fprintf(stderr, "usage: vi_soak_cycles [--cycles N] [--sample PATH]\n"), 2;
     }
     setvbuf(stdout, nullptr, _IOLBF, 0);
 
@@ -121,23 +102,19 @@ int main(int argc, char** argv) {
             VI_NATIVE(prehandlePause)(env, thiz);
         else
             VI_NATIVE(prehandleStop)(env, thiz);
-        if (!jni.misuses().empty()) {
-            std::printf("cycles: JNI misuse: %s\n", jni.misuses().front().c_str());
-            return 1;
-        }
-        if (jni.outstandingElements() || jni.outstandingUtfChars()) {
-            std::printf("cycles: cycle %d left JNI strings or arrays unreleased\n", cycle);
+        if (!jni.misuses().empty() || jni.outstandingElements() || jni.outstandingUtfChars()) {
+            std::printf("cycles: cycle %d misused JNI or left strings or arrays unreleased\n", cycle);
             return 1;
         }
         jni.reset();
         if (cycle == 0) first = sizes();
-        if ((cycle + 1) % 1000 == 0)
-            std::printf("cycles: %d done, peak resident %ld kB\n", cycle + 1, residentKilobytes());
+        if ((cycle + 1) % 1000 == 0) std::printf("cycles: %d done\n", cycle + 1);
     }
 
     const Sizes last = sizes();
-    print("after the first cycle", first);
-    print("after the last cycle", last);
+    std::printf("cycles: renderers and textures registered, textures and models filed, animations: "
+                "%zu %zu %zu %zu %zu after the first cycle, %zu %zu %zu %zu %zu after the last\n",
+                first[0], first[1], first[2], first[3], first[4], last[0], last[1], last[2], last[3], last[4]);
     if (last != first) {
         std::printf("cycles: FAULT: what the runtime keeps grew over %d cycles\n", cycles);
         return 1;

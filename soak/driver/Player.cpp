@@ -1,5 +1,7 @@
 #include "Player.h"
 
+#include <algorithm>
+
 #include "Application/Application.h"
 #include "TestSceneRecord.h"
 
@@ -7,20 +9,22 @@ namespace visoak {
 
 namespace {
 
-const int kCanvas = 64;      // the pbuffer the host draws into
-const int kDrawResult = 7;   // what the test scene's frames return: a frame was drawn
-const char* const kMissingLibrary = "/nonexistent/libmissing-effect.so";
+const int kCanvas = 64;     // the pbuffer the host draws into
+const int kDrawResult = 7;  // what the test scene's frames return: a frame was drawn
+const int kSizes[][2] = {{0, 7}, {5, 0}, {1, 1}, {3, 2}, {7, 5}, {16, 16}, {33, 17}, {64, 64}, {128, 96}, {1080, 1920}};
 
 std::vector<jint> hostPixels(int pattern, int width, int height) {
     std::vector<jint> pixels(std::size_t(width) * std::size_t(height));
     for (std::size_t i = 0; i < pixels.size(); ++i)
-        pixels[i] = jint((pattern == 3 ? 0x80000000u : 0xFF000000u) | ((unsigned(i) * 2654435761u + unsigned(pattern)) >> 8));
+        pixels[i] = jint((pattern == 3 ? 0x80000000u : 0xFF000000u) | (unsigned(i) * 2654435761u + unsigned(pattern)) >> 8);
     return pixels;
 }
 
 }  // namespace
 
-Player::Player() : mGl(kCanvas, kCanvas), mContext(ContextMain), mStarted(false), mSceneMayLive(false), mGeneration{0, 0}, mEqualFrames(0) {
+Player::Player()
+    : mGl(kCanvas, kCanvas), mContext(ContextMain), mStarted(false), mSceneMayLive(false), mGeneration{0, 0},
+      mEqualFrames(0) {
     testSceneReset();
     testSceneSetDrawResult(kDrawResult);
     testSceneSetClearColour(1, 0.25f, 0.5f, 0.75f, 1.0f);
@@ -32,17 +36,16 @@ Player::Player() : mGl(kCanvas, kCanvas), mContext(ContextMain), mStarted(false)
 Player::~Player() {
     if (mContext == ContextNone) mGl.makeCurrent();
     VI_NATIVE(prehandleStop)(mJni.env(), mJni.thiz());
-    for (const std::string& loaded : mLoaded)
-        VI_NATIVE(loadTexture)(mJni.env(), nullptr, mJni.string(loaded), nullptr, 0, 0);
+    for (const std::string& image : mLoaded) VI_NATIVE(loadTexture)(mJni.env(), nullptr, mJni.string(image), nullptr, 0, 0);
 }
 
-std::string Player::name(int kind) const {
+std::string Player::imageName(int kind) const {
     return (kind == 0 ? "picture-" : "image-") + std::to_string(mGeneration[kind]);
 }
 
 // The scene shows the image filed under its first name.
 void Player::nameScenePicture() {
-    const std::string picture = name(0);
+    const std::string picture = imageName(0);
     const char* names[] = {picture.c_str(), "other"};
     testSceneSetNames(names, 2);
 }
@@ -50,12 +53,12 @@ void Player::nameScenePicture() {
 Player::Outcome Player::play(const Call& call, std::string& fault) {
     JNIEnv* env = mJni.env();
     jobject thiz = mJni.thiz();
-    // Only a frame right after a context change is compared with the one before it.
+    // Only the frame right after a context change is compared with the one before it.
     const std::vector<std::uint8_t> beforeChange = std::move(mBeforeChange);
     mBeforeChange.clear();
     Outcome outcome = Played;
     switch (call.kind) {
-        case CallStart: start(call, outcome); break;
+        case CallStart: outcome = start(call) ? Played : Skipped; break;
         case CallInitEffect: VI_NATIVE(prehandleInitEffect)(env, thiz); break;
         case CallRestart:
             if (!mStarted) return Skipped;
@@ -80,29 +83,24 @@ Player::Outcome Player::play(const Call& call, std::string& fault) {
         case CallUnlock: VI_NATIVE(prehandleUnlock)(env, thiz); break;
         case CallSetOrientation: VI_NATIVE(prehandleSetOrientation)(env, thiz, call.a); break;
         case CallLoadModel: VI_NATIVE(loadModel)(env, thiz, mJni.string("model")); break;
-        case CallLoadTexture: loadTexture(call, outcome); break;
+        case CallLoadTexture: outcome = loadTexture(call) ? Played : Skipped; break;
         case CallWindow: vi::Application::handleWindowRectangle(call.a, call.b, call.c, call.d); break;
         case CallContextSwitch:
         case CallContextLoss:
-        case CallContextNone: {
-            std::vector<std::uint8_t> before = frame();
-            outcome = compare(beforeChange, before, fault);
+        case CallContextNone:
+            mBeforeChange = frame();
+            outcome = compare(beforeChange, mBeforeChange, fault);
             if (call.kind == CallContextNone) {
                 vitest::GlContext::releaseCurrent();
                 mContext = ContextNone;
-            } else if (call.kind == CallContextLoss) {
-                mGl.recreate();
-                mContext = ContextMain;
-            } else if (mContext == ContextSecond) {
-                mGl.makeCurrent();
-                mContext = ContextMain;
-            } else {
+            } else if (call.kind == CallContextSwitch && mContext == ContextMain) {
                 mGl.makeSecondCurrent();
                 mContext = ContextSecond;
+            } else {
+                call.kind == CallContextLoss ? mGl.recreate() : mGl.makeCurrent();
+                mContext = ContextMain;
             }
-            mBeforeChange = std::move(before);
             break;
-        }
         case CallKindCount: return Skipped;
     }
     if (!mJni.misuses().empty()) {
@@ -113,41 +111,33 @@ Player::Outcome Player::play(const Call& call, std::string& fault) {
     return outcome;
 }
 
-void Player::start(const Call& call, Outcome& outcome) {
-    const std::string library = call.a < 15 ? VI_SOAK_TEST_PLUGIN : call.a < 17 ? VI_SOAK_NOFACTORY_PLUGIN : kMissingLibrary;
-    if (mBroken.count(library)) {
-        outcome = Skipped;
-        return;
-    }
+bool Player::start(const Call& call) {
+    const std::string library = call.a < 15 ? VI_SOAK_TEST_PLUGIN
+                                : call.a < 17 ? VI_SOAK_NOFACTORY_PLUGIN
+                                              : "/nonexistent/libmissing-effect.so";
+    if (mBroken.count(library)) return false;
     mStarted = VI_NATIVE(prehandleStart)(mJni.env(), mJni.thiz(), mJni.string(library), call.b, call.c) != nullptr;
     mSceneMayLive = mStarted;
     if (!mStarted) mBroken.insert(library);
+    return true;
 }
 
-void Player::loadTexture(const Call& call, Outcome& outcome) {
-    const int kind = call.a < 6 ? 0 : 1;
-    const bool unload = call.d != 0;
-    // The host loads on its render thread, with its context; it unloads the
-    // scene's picture only once no scene can show it.
-    if (mContext == ContextNone || (unload && kind == 0 && mSceneMayLive)) {
-        outcome = Skipped;
-        return;
-    }
-    const std::string image = name(kind);
-    if (unload) {
+bool Player::loadTexture(const Call& call) {
+    const int kind = call.a < 6 ? 0 : 1;  // the scene's picture, or another image
+    const std::string image = imageName(kind);
+    if (mContext == ContextNone || (call.d == 0 && kind == 0 && mSceneMayLive)) return false;
+    if (call.d == 0) {
         VI_NATIVE(loadTexture)(mJni.env(), nullptr, mJni.string(image), nullptr, 0, 0);
         // The entry keeps the deleted texture's pointer: the name is done with.
         if (mLoaded.erase(image)) ++mGeneration[kind];
-        if (kind == 0) nameScenePicture();
-        return;
+        nameScenePicture();
+        return true;
     }
-    static const int kSizes[][2] = {{0, 7}, {5, 0}, {1, 1}, {3, 2}, {7, 5}, {16, 16}, {33, 17}, {64, 64}, {128, 96}};
-    const int* size = call.c == 39 ? nullptr : kSizes[call.c % 9];
-    const int width = size ? size[0] : 1080;
-    const int height = size ? size[1] : 1920;
-    VI_NATIVE(loadTexture)(mJni.env(), nullptr, mJni.string(image), mJni.intArray(hostPixels(call.b, width, height)),
-                           width, height);
+    const int* size = kSizes[call.c < 39 ? call.c % 9 : 9];
+    VI_NATIVE(loadTexture)(mJni.env(), nullptr, mJni.string(image), mJni.intArray(hostPixels(call.b, size[0], size[1])),
+                           size[0], size[1]);
     mLoaded.insert(image);
+    return true;
 }
 
 // A frame of a ready scene with a context current, read back; empty when the
@@ -161,15 +151,12 @@ std::vector<std::uint8_t> Player::frame() {
 Player::Outcome Player::compare(const std::vector<std::uint8_t>& before, const std::vector<std::uint8_t>& after,
                                 std::string& fault) {
     if (before.empty() || after.empty()) return Played;
-    mEqualFrames += before == after;
-    if (before == after) return Played;
     int differing = 0;
-    for (std::size_t i = 0; i < after.size(); i += 4)
-        differing += before[i] != after[i] || before[i + 1] != after[i + 1] || before[i + 2] != after[i + 2] ||
-                     before[i + 3] != after[i + 3];
-    fault = "the first frame after a context change differs from the frame before it in " +
-            std::to_string(differing) + " of " + std::to_string(kCanvas * kCanvas) + " pixels";
-    return FrameDiffers;
+    for (std::size_t i = 0; i < after.size(); i += 4) differing += std::equal(&after[i], &after[i] + 4, &before[i]) ? 0 : 1;
+    mEqualFrames += differing == 0;
+    if (differing) fault = "the first frame after a context change differs from the frame before it in " +
+                           std::to_string(differing) + " of " + std::to_string(kCanvas * kCanvas) + " pixels";
+    return differing ? FrameDiffers : Played;
 }
 
 }  // namespace visoak

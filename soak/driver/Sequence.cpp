@@ -1,85 +1,53 @@
-#include "Sequence.h"
-
 #include <random>
+
+#include "Player.h"
 
 namespace visoak {
 
 namespace {
 
-// In CallKind order: the name, how many of a, b, c, d it uses, and how often
-// it comes (frames and input dominate, as with a real host; lifecycle changes
-// and context trouble are common enough to meet each other).
+// In CallKind order: the name, how often it comes (frames and input dominate,
+// as with a real host; lifecycle changes and context trouble are common
+// enough to meet each other), and the range of each argument it takes.
 struct KindInfo {
     const char* name;
-    int arguments;
     int weight;
+    int arguments = 0;
+    int ranges[4][2] = {};
 };
 
 const KindInfo kKinds[CallKindCount] = {
-    {"start", 3, 4},         {"initEffect", 0, 12},     {"restart", 0, 3},     {"stop", 0, 1},
-    {"pause", 0, 1},         {"recycleTextures", 0, 2}, {"draw", 0, 30},       {"touch", 3, 10},
-    {"menu", 0, 1},          {"volumeUp", 0, 1},        {"volumeDown", 0, 1},  {"key", 1, 2},
-    {"param", 2, 4},         {"clearEffect", 0, 2},     {"affordance", 0, 2},  {"unlock", 0, 2},
-    {"setOrientation", 1, 3}, {"loadModel", 0, 1},      {"loadTexture", 4, 8}, {"windowRectangle", 4, 2},
-    {"contextSwitch", 0, 3}, {"contextLoss", 0, 3},     {"contextNone", 0, 2},
+    {"start", 4, 3, {{0, 19}, {-40, 1200}, {-40, 2000}}}, {"initEffect", 12}, {"restart", 3}, {"stop", 1},
+    {"pause", 1}, {"recycleTextures", 2}, {"draw", 30}, {"touch", 10, 3, {{-100, 1200}, {-100, 2000}, {-1, 3}}},
+    {"menu", 1}, {"volumeUp", 1}, {"volumeDown", 1}, {"key", 2, 1, {{60, 90}}},
+    {"param", 4, 2, {{-1000, 1000}, {-1000, 1000}}}, {"clearEffect", 2}, {"affordance", 2}, {"unlock", 2},
+    {"setOrientation", 3, 1, {{-1, 2}}}, {"loadModel", 1}, {"loadTexture", 8, 4, {{0, 9}, {0, 3}, {0, 39}, {0, 5}}},
+    {"windowRectangle", 2, 4, {{-50, 500}, {-50, 500}, {-3, 1200}, {-3, 2000}}},
+    {"contextSwitch", 3}, {"contextLoss", 3}, {"contextNone", 2},
 };
-
-std::uint64_t mix(std::uint64_t seed, std::uint64_t stream) {
-    std::uint64_t z = seed + 0x9E3779B97F4A7C15ull * (stream + 1);
-    z = (z ^ (z >> 30)) * 0xBF58476D1CE4E5B9ull;
-    z = (z ^ (z >> 27)) * 0x94D049BB133111EBull;
-    return z ^ (z >> 31);
-}
 
 }  // namespace
 
 std::vector<Call> makeSequence(std::uint64_t seed, int index) {
-    std::mt19937_64 random(mix(seed, std::uint64_t(index)));
-    auto below = [&random](int n) { return int(random() % std::uint64_t(n)); };
-    auto between = [&](int low, int high) { return low + below(high - low + 1); };
+    std::seed_seq seeds{std::uint32_t(seed), std::uint32_t(seed >> 32), std::uint32_t(index)};
+    std::mt19937_64 random(seeds);
+    auto between = [&random](int low, int high) { return low + int(random() % std::uint64_t(high - low + 1)); };
     int total = 0;
     for (const KindInfo& kind : kKinds) total += kind.weight;
 
     std::vector<Call> calls;
-    const int length = between(20, 160);
-    while (int(calls.size()) < length) {
-        Call call = {CallDraw, 0, 0, 0, 0};
-        for (int pick = below(total), k = 0; k < CallKindCount; pick -= kKinds[k++].weight)
-            if (pick < kKinds[k].weight) {
-                call.kind = CallKind(k);
-                break;
-            }
-        switch (call.kind) {
-            case CallStart:
-                call = {CallStart, below(20), below(10) ? between(1, 1200) : between(-4, 0),
-                        below(10) ? between(1, 2000) : between(-4, 0), 0};
-                break;
-            case CallTouch:
-                call = {CallTouch, between(-100, 1200), between(-100, 2000), below(12) ? below(3) : between(-5, 9), 0};
-                break;
-            case CallKey:
-                // 67 ('C') blocks its caller for good, by design; 84 ('T') is the self-test.
-                call.a = below(4) == 0 ? 65 : below(3) == 0 ? 85 : below(1100);
-                if (call.a == 67 || call.a == 84) ++call.a;
-                break;
-            case CallParam:
-                call = {CallParam, between(-1000, 1000), between(-1000, 1000), 0, 0};
-                break;
-            case CallSetOrientation:
-                call.a = below(8) ? below(2) : int(std::uint32_t(random()));
-                break;
-            case CallLoadTexture:
-                call = {CallLoadTexture, below(10), below(4), below(40), below(6) == 0};
-                break;
-            case CallWindow:
-                call = {CallWindow, between(-50, 500), between(-50, 500), between(-3, 1200), between(-3, 2000)};
-                break;
-            default:
-                break;
+    for (int length = between(20, 160); int(calls.size()) < length;) {
+        int kind = 0;
+        for (int pick = between(0, total - 1); pick >= kKinds[kind].weight; pick -= kKinds[kind++].weight) {
         }
-        calls.push_back(call);
-        // Mostly a frame right after a context change: the frame checked against the one before it.
-        if (call.kind >= CallContextSwitch && below(4)) calls.push_back(Call{CallDraw, 0, 0, 0, 0});
+        int values[4] = {0, 0, 0, 0};
+        for (int i = 0; i < kKinds[kind].arguments; ++i) values[i] = between(kKinds[kind].ranges[i][0], kKinds[kind].ranges[i][1]);
+        // 67 ('C') blocks its caller for good, by design; 84 ('T') runs the self-test.
+        if (kind == CallKey && (values[0] == 67 || values[0] == 84)) ++values[0];
+        if (kind == CallSetOrientation && between(0, 7) == 0) values[0] = int(std::uint32_t(random()));
+        calls.push_back(Call{CallKind(kind), values[0], values[1], values[2], values[3]});
+        // Mostly a frame right after a context change: the frame compared with the one before it.
+        if (kind >= CallContextSwitch && between(0, 3)) calls.push_back(Call{CallDraw, 0, 0, 0, 0});
     }
     return calls;
 }
