@@ -109,7 +109,9 @@ void shrink(std::uint64_t seed, int index, int failingCall, int status) {
     const double deadline = seconds() + kShrinkSeconds;
     int replays = 0;
     auto fails = [&](const std::vector<int>& candidate) {
-        return ++replays <= kMaxReplays && seconds() < deadline && inChild(seed, index, candidate, true) == status;
+        if (replays == kMaxReplays || seconds() >= deadline) return false;
+        ++replays;
+        return inChild(seed, index, candidate, true) == status;
     };
     std::printf("soak: shrinking...\n");
     const std::vector<int> prefix(calls.begin(), calls.begin() + std::min<long>(failingCall + 1, long(calls.size())));
@@ -127,8 +129,8 @@ void shrink(std::uint64_t seed, int index, int failingCall, int status) {
         chunk = dropped ? std::min(chunk, std::max<std::size_t>(calls.size() / 2, 1)) : chunk / 2;
     }
     std::string list;
-    std::printf("soak: reproduction (%zu calls, after %d replays), seed %llu, sequence %d:\n", calls.size(),
-                std::min(replays, kMaxReplays), (unsigned long long)seed, index);
+    std::printf("soak: reproduction (%zu calls, after %d replays), seed %llu, sequence %d:\n", calls.size(), replays,
+                (unsigned long long)seed, index);
     for (int i : calls) {
         std::printf("  %3d: %s\n", i, visoak::describe(sequence[std::size_t(i)]).c_str());
         list += (list.empty() ? "" : ",") + std::to_string(i);
