@@ -35,7 +35,7 @@ inline std::string quote(const std::string& text) {
 
 // Runs the real executable; the scratch directory takes its two streams.
 inline ToolRun runTool(const ScratchDirectory& scratch, const std::vector<std::string>& arguments) {
-    std::string command = quote(VI_MODELCONV_PATH);
+    std::string command = VI_MODELCONV_EMULATOR " " + quote(VI_MODELCONV_PATH);
     for (const std::string& argument : arguments) command += " " + quote(argument);
     command += " >" + quote(scratch.pathOf(".stdout")) + " 2>" + quote(scratch.pathOf(".stderr"));
     ToolRun run;

@@ -1,10 +1,11 @@
 #!/usr/bin/env bash
 # The runtime exports the host's JNI entry points, the vi classes plug-ins use
 # and the desktop asset functions, and nothing else.
-# usage: CheckExports.sh libtarqvevyncommon.so
+# usage: CheckExports.sh libtarqvevyncommon.so [nm of the library's toolchain]
 set -euo pipefail
 library="$1"
-symbols="$(nm -D --defined-only "$library" | awk '{print $3}')"
+nm="${2:-nm}"
+symbols="$("$nm" -D --defined-only "$library" | awk '{print $3}')"
 [ -n "$symbols" ] || { echo "no exported symbols read from $library" >&2; exit 1; }
 
 stray="$(echo "$symbols" | c++filt | grep -v -E \

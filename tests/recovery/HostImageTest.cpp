@@ -1,6 +1,7 @@
 // The conversion of the host's ARGB ints into a texture's RGBA bytes: the
-// worked example, and the byte-shuffle form against the portable one on
-// lengths that leave a tail and on pointers of every alignment.
+// worked example, the byte-shuffle form each CPU must take, and that form
+// against the portable one on every tail, full screens and pointers of every
+// alignment.
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -40,11 +41,27 @@ TEST(HostImage, TwoPixelExampleGivesRgbaBytesAndLeavesTheHostArraySwapped) {
     }
 }
 
-// Every form on every length and every misalignment of both pointers: the
-// result matches the per-int formula, and nothing outside the n pixels moves.
-TEST(HostImage, FormsAgreeOnOddLengthsAndUnalignedPointers) {
+// The form each CPU the runtime ships for must take: a build that falls
+// back to the portable loop (NEON or SSSE3 not compiled in) fails here.
+TEST(HostImage, TakesTheByteShuffleOfThisCpu) {
+#if defined(__aarch64__)
+    EXPECT_STREQ(HostImage::shuffleName(), "NEON");
+    EXPECT_TRUE(HostImage::hasShuffle());
+#elif defined(__x86_64__)
+    EXPECT_STREQ(HostImage::shuffleName(), "SSSE3");
+    EXPECT_EQ(HostImage::hasShuffle(), __builtin_cpu_supports("ssse3") != 0);
+#else
+    GTEST_SKIP() << "no byte shuffle is expected on this CPU";
+#endif
+}
+
+// Every form on widths 1 to 67 (every tail, several whole vectors) with both
+// pointers at every misalignment, and on a full 1080 x 1920 screen aligned
+// and not: the result matches the per-int formula, and nothing outside the n
+// pixels moves.
+TEST(HostImage, FormsAgreeOnEveryWidthAndUnalignedPointers) {
     const unsigned char kGuard = 0x5A;
-    for (std::size_t count : {1u, 3u, 5u, 17u, 1001u}) {
+    auto check = [&](const Form& form, std::size_t count, std::size_t hostOffset, std::size_t textureOffset) {
         std::vector<std::uint32_t> original(count);
         for (std::size_t i = 0; i < count; ++i) original[i] = std::uint32_t(0x9E3779B9u * (i + 1)) ^ 0x01020304u;
         std::vector<unsigned char> expected(count * 4);
@@ -53,28 +70,29 @@ TEST(HostImage, FormsAgreeOnOddLengthsAndUnalignedPointers) {
             const std::uint32_t swapped = (v & 0xFF00FF00u) | ((v >> 16) & 0xFFu) | ((v & 0xFFu) << 16);
             std::memcpy(&expected[i * 4], &swapped, 4);
         }
-        for (const Form& form : forms()) {
-            for (std::size_t hostOffset = 0; hostOffset < 4; ++hostOffset) {
-                for (std::size_t textureOffset = 0; textureOffset < 4; ++textureOffset) {
-                    std::vector<unsigned char> host(count * 4 + 8, kGuard);
-                    std::vector<unsigned char> texture(count * 4 + 8, kGuard);
-                    std::memcpy(&host[hostOffset], original.data(), count * 4);
-                    form.convert(&host[hostOffset], &texture[textureOffset], count);
+        std::vector<unsigned char> host(count * 4 + 8, kGuard);
+        std::vector<unsigned char> texture(count * 4 + 8, kGuard);
+        std::memcpy(&host[hostOffset], original.data(), count * 4);
+        form.convert(&host[hostOffset], &texture[textureOffset], count);
 
-                    const std::vector<unsigned char> hostResult(host.begin() + hostOffset,
-                                                                host.begin() + hostOffset + count * 4);
-                    const std::vector<unsigned char> textureResult(texture.begin() + textureOffset,
-                                                                   texture.begin() + textureOffset + count * 4);
-                    ASSERT_EQ(expected, hostResult) << form.name << " " << count << " " << hostOffset;
-                    ASSERT_EQ(expected, textureResult) << form.name << " " << count << " " << textureOffset;
-                    for (std::size_t i = 0; i < hostOffset; ++i) ASSERT_EQ(kGuard, host[i]);
-                    for (std::size_t i = hostOffset + count * 4; i < host.size(); ++i) ASSERT_EQ(kGuard, host[i]);
-                    for (std::size_t i = 0; i < textureOffset; ++i) ASSERT_EQ(kGuard, texture[i]);
-                    for (std::size_t i = textureOffset + count * 4; i < texture.size(); ++i)
-                        ASSERT_EQ(kGuard, texture[i]);
-                }
-            }
+        SCOPED_TRACE(::testing::Message() << form.name << " width " << count << " offsets " << hostOffset << " "
+                                          << textureOffset);
+        ASSERT_EQ(0, std::memcmp(expected.data(), &host[hostOffset], count * 4));
+        ASSERT_EQ(0, std::memcmp(expected.data(), &texture[textureOffset], count * 4));
+        for (std::size_t i = 0; i < 8; ++i) {
+            const std::size_t hostGuard = i < hostOffset ? i : count * 4 + i;
+            const std::size_t textureGuard = i < textureOffset ? i : count * 4 + i;
+            ASSERT_EQ(kGuard, host[hostGuard]) << hostGuard;
+            ASSERT_EQ(kGuard, texture[textureGuard]) << textureGuard;
         }
+    };
+    for (const Form& form : forms()) {
+        for (std::size_t count = 1; count <= 67; ++count)
+            for (std::size_t hostOffset = 0; hostOffset < 4; ++hostOffset)
+                for (std::size_t textureOffset = 0; textureOffset < 4; ++textureOffset)
+                    check(form, count, hostOffset, textureOffset);
+        check(form, 1080 * 1920, 0, 0);
+        check(form, 1080 * 1920, 1, 3);
     }
 }
 
