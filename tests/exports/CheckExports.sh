@@ -16,19 +16,21 @@ if [ -n "$stray" ]; then
   exit 1
 fi
 
+# Here-strings, not pipes: grep -q stops reading at its match, and under
+# pipefail the writer's broken pipe would count as a miss.
 methods="prehandleStart prehandleInitEffect prehandleRestart prehandleStop prehandlePause
   prehandleRecycleTextures prehandleDraw prehandleTouch prehandleMenuPressed prehandleVolumeUpPressed
   prehandleVolumeDownPressed prehandleParam prehandleClearEffect prehandleAffordance prehandleUnlock
   prehandleSetOrientation loadModel loadTexture"
 missing=0
 for method in $methods; do
-  if ! echo "$symbols" | grep -qx "Java_com_tarq_android_visualeffect_common_Native_$method"; then
+  if ! grep -qx "Java_com_tarq_android_visualeffect_common_Native_$method" <<<"$symbols"; then
     echo "JNI entry point not exported: $method" >&2
     missing=1
   fi
 done
 for asset_function in AAssetManager_open AAsset_getLength AAsset_read AAsset_close; do
-  if ! echo "$symbols" | grep -qx "$asset_function"; then
+  if ! grep -qx "$asset_function" <<<"$symbols"; then
     echo "asset function not exported: $asset_function" >&2
     missing=1
   fi
