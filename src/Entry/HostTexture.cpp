@@ -12,6 +12,7 @@
 #include "Application/ContextRecovery.h"
 #include "Application/Scene.h"
 #include "Entry/HostImage.h"
+#include "Render/NamedValues.h"
 #include "Render/Texture.h"
 
 namespace {
@@ -19,13 +20,7 @@ namespace {
 // A host image as a texture: uploaded once, plain repeat, linear, RGBA bytes.
 // No GL work: the context recovery or the scene allocates it before first use.
 void fileNewTexture(const std::string& name, void* buffer, unsigned int width, unsigned int height) {
-    const bool kUploadOnce = true;
-    const bool kRepeat = true;
-    const bool kNotMirrored = false;
-    const bool kLinear = true;
-    const bool kNotCompressed = false;
-    const unsigned int kRgba = 4;
-    const bool kBytes = false;
+    using namespace vi::TextureArgument;
     vi::ApplicationVar::msTexturesMap[name] = new vi::Texture(buffer, width, height, kUploadOnce, kRepeat,
                                                               kNotMirrored, kLinear, kNotCompressed, kRgba, kBytes);
     vi::ApplicationVar::msTexturesMap[name]->setDeletable(true);

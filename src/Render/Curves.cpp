@@ -2,6 +2,7 @@
 
 #include <cstring>
 
+#include "Render/NamedValues.h"
 #include "Render/Texture.h"
 
 namespace vi {
@@ -72,13 +73,7 @@ void Curves::calculateCatmullRomPoints(const glm::vec2* red, int redCount, const
     // One texel wide, one row per input level. Dynamic, so that the table is
     // uploaded at every bind and later edits show; not deletable, the table is
     // this object's own. An earlier texture is not deleted here.
-    const bool kEveryBind = false;
-    const bool kRepeat = true;
-    const bool kNotMirrored = false;
-    const bool kLinear = true;
-    const bool kNotCompressed = false;
-    const unsigned int kRgba = 4;
-    const bool kBytes = false;
+    using namespace TextureArgument;
     mTexture = new Texture(mTable, 1, 256, kEveryBind, kRepeat, kNotMirrored, kLinear, kNotCompressed, kRgba, kBytes);
 }
 

@@ -28,4 +28,17 @@ enum AnchorSlot {
     kAnchorSlotCount = 5,
 };
 
+// The Texture constructor's flags by name, for call sites: its parameter list
+// (ten plain values) is fixed by the plug-in interface.
+namespace TextureArgument {
+constexpr bool kUploadOnce = true;  // static: uploaded at allocation
+constexpr bool kEveryBind = false;  // dynamic: uploaded at every bind
+constexpr bool kRepeat = true;
+constexpr bool kNotMirrored = false;
+constexpr bool kLinear = true;
+constexpr bool kNotCompressed = false;
+constexpr unsigned int kRgba = 4;
+constexpr bool kBytes = false;
+}  // namespace TextureArgument
+
 }  // namespace vi

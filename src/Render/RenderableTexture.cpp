@@ -13,11 +13,6 @@ glm::ivec2 RenderableTexture::mCurrentFrameBufferSize(0, 0);
 
 namespace {
 
-// A target's colour is its texture: RGBA bytes, never compressed.
-constexpr bool kNotCompressed = false;
-constexpr unsigned int kRgba = 4;
-constexpr bool kBytes = false;
-
 // The framebuffer and viewport the framework last bound, as the statics hold them.
 struct Binding {
     GLuint frameBuffer;
@@ -56,7 +51,8 @@ RenderableTexture::RenderableTexture(std::vector<Renderer*>& renderers, unsigned
 
 RenderableTexture::RenderableTexture(unsigned int x, unsigned int y, unsigned int width, unsigned int height,
                                      bool isStatic, bool isRepeat, bool isMirrored, bool isLinear, bool hasDepth)
-    : Texture(nullptr, width, height, isStatic, isRepeat, isMirrored, isLinear, kNotCompressed, kRgba, kBytes),
+    : Texture(nullptr, width, height, isStatic, isRepeat, isMirrored, isLinear, TextureArgument::kNotCompressed,
+              TextureArgument::kRgba, TextureArgument::kBytes),
       mTargetViewMatrix(1.0f),
       mTargetProjectionMatrix(1.0f),
       mPosition{x, y},

@@ -2,6 +2,8 @@
 
 #include <cstdlib>
 
+#include "Render/NamedValues.h"
+
 namespace vi {
 
 namespace {
@@ -14,10 +16,6 @@ constexpr GLenum kFaceTargets[kFaceCount] = {
     GL_TEXTURE_CUBE_MAP_NEGATIVE_Y, GL_TEXTURE_CUBE_MAP_POSITIVE_Z, GL_TEXTURE_CUBE_MAP_NEGATIVE_Z,
 };
 
-// Faces are always RGBA bytes (or ETC1).
-constexpr unsigned int kRgba = 4;
-constexpr bool kBytes = false;
-
 }  // namespace
 
 // mBuffer stays null: every face, face 0 included, is read through mFaces, so
@@ -26,7 +24,8 @@ constexpr bool kBytes = false;
 // upload would read.
 TextureCube::TextureCube(void* const faces[6], const unsigned int widths[6], const unsigned int heights[6],
                          bool isStatic, bool isRepeat, bool isMirrored, bool isLinear, bool isCompressed)
-    : Texture(nullptr, widths[0], heights[0], isStatic, isRepeat, isMirrored, isLinear, isCompressed, kRgba, kBytes),
+    : Texture(nullptr, widths[0], heights[0], isStatic, isRepeat, isMirrored, isLinear, isCompressed,
+              TextureArgument::kRgba, TextureArgument::kBytes),
       mFaces(faces, faces + kFaceCount),
       mFaceWidths(widths, widths + kFaceCount),
       mFaceHeights(heights, heights + kFaceCount) {
