@@ -8,6 +8,7 @@
 
 #include "GlContext.h"
 #include "GlRecorder.h"
+#include "Painters.h"
 #include "Pictures.h"
 #include "Render/Drawable.h"
 #include "Render/GeometryRectangle.h"
@@ -32,11 +33,6 @@ const char* const kQuadVertex =
     "  vTexCoord = aTexCoord;\n"
     "  gl_Position = uModelViewProjectionMatrix * vec4(aPosition, 1.0);\n"
     "}\n";
-const char* const kQuadFragment =
-    "precision mediump float;\n"
-    "uniform sampler2D uTexture;\n"
-    "varying vec2 vTexCoord;\n"
-    "void main() { gl_FragColor = texture2D(uTexture, vTexCoord); }\n";
 const char* const kTwoSamplersFragment =
     "precision mediump float;\n"
     "uniform sampler2D uFirst;\n"
@@ -129,7 +125,7 @@ TEST_F(RendererTextureTest, SamplersGetUnitsInOrderWithSizeUniformsAndNullOrUnkn
 }
 
 TEST_F(RendererTextureTest, TexturedQuadReadsBackAsTheTextureWithItsTopRowUp) {
-    vi::ShaderProgram program(kQuadVertex, kQuadFragment);
+    vi::ShaderProgram program(kQuadVertex, vitest::textureFragmentShader());
     ScreenQuad quad;
     std::vector<std::uint8_t> pixels = texelPattern();
     vi::Texture texture(pixels.data(), kTexels, kTexels, true, false, false, false, false, 4, false);

@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "Application/ApplicationVar.h"
+#include "Painters.h"
 #include "Render/GL.h"
 
 namespace recoverytest {
@@ -23,11 +24,6 @@ const char* const kQuadVertex =
     "  vTexCoord = aTexCoord;\n"
     "  gl_Position = vec4(aPosition + uOffset, 0.0, 1.0);\n"
     "}\n";
-const char* const kQuadFragment =
-    "precision mediump float;\n"
-    "uniform sampler2D uTexture;\n"
-    "varying vec2 vTexCoord;\n"
-    "void main() { gl_FragColor = texture2D(uTexture, vTexCoord); }\n";
 
 // A half-window square from (0, 0) to (0.5, 0.5) in clip space, moved by uOffset.
 const float kQuadPositions[] = {0.0f, 0.0f, 0.5f, 0.0f, 0.0f, 0.5f, 0.5f, 0.5f};
@@ -66,7 +62,7 @@ void RecoveryScene::initEffect() {
 
     background = new vi::Background(*backgroundTexture);
 
-    quadProgram = new vi::ShaderProgram(kQuadVertex, kQuadFragment);
+    quadProgram = new vi::ShaderProgram(kQuadVertex, vitest::textureFragmentShader());
     vi::Texture* samplers[2] = {checkerTexture, dynamicTexture};
     for (int i = 0; i < 2; ++i) {
         vi::Drawable& quad = quads[i];

@@ -24,6 +24,14 @@ inline const char* quadVertexShader() {
            "}\n";
 }
 
+// Samples uTexture at vTexCoord: the fragment half of the tests' textured quads.
+inline const char* textureFragmentShader() {
+    return "precision mediump float;\n"
+           "uniform sampler2D uTexture;\n"
+           "varying vec2 vTexCoord;\n"
+           "void main() { gl_FragColor = texture2D(uTexture, vTexCoord); }\n";
+}
+
 // The quad over the whole viewport, as a drawable.
 struct Quad : vi::Drawable {
     Quad() {
