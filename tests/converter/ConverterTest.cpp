@@ -1,0 +1,184 @@
+// vi-modelconv run as effect authors run it: a separate process on files
+// written here, judged by its status, its messages and the model file it
+// leaves, read where the runtime reads it: V and I, then positions at 8,
+// normals at 8 + 12 V, uv at 8 + 24 V, 16-bit indices at 8 + 32 V.
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <iterator>
+#include <sstream>
+
+#include <glm/glm.hpp>
+#include <gmock/gmock.h>
+
+namespace {
+namespace fs = std::filesystem;
+const fs::path kDir = fs::temp_directory_path() / ("vi-modelconv-test-" + std::to_string(getpid()));
+
+std::string slurp(const fs::path& path) {
+    std::ifstream in(path, std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(in), {});
+}
+
+// The tool's status and both its streams.
+std::pair<int, std::string> run(const std::vector<std::string>& arguments) {
+    std::string command = VI_MODELCONV;
+    for (const std::string& argument : arguments) command += " '" + argument + "'";
+    const int raw = std::system((command + " >" + kDir.string() + ".log 2>&1").c_str());
+    return {WIFEXITED(raw) ? WEXITSTATUS(raw) : -1, slurp(kDir.string() + ".log")};
+}
+
+struct Model {
+    std::size_t v = 0, i = 0;
+    std::vector<glm::vec3> positions, normals;
+    std::vector<glm::vec2> uvs;
+    std::vector<std::uint16_t> indices;
+};
+
+template <class T> T at(const std::string& bytes, std::size_t offset) {
+    T value;
+    std::memcpy(&value, bytes.data() + offset, sizeof value);  // little-endian, as on the phone
+    return value;
+}
+
+Model decode(const std::string& b) {
+    Model m;
+    if (b.size() < 8 || b.size() != 8 + 32 * std::size_t(at<std::uint32_t>(b, 0)) + 2 * at<std::uint32_t>(b, 4)) {
+        ADD_FAILURE() << "a model file of " << b.size() << " bytes does not match its counts";
+        return m;
+    }
+    m.v = at<std::uint32_t>(b, 0);
+    m.i = at<std::uint32_t>(b, 4);
+    for (std::size_t k = 0; k < m.v; ++k) {
+        const std::size_t p = 8 + 12 * k, n = p + 12 * m.v, t = 8 + 24 * m.v + 8 * k;
+        m.positions.emplace_back(at<float>(b, p), at<float>(b, p + 4), at<float>(b, p + 8));
+        m.normals.emplace_back(at<float>(b, n), at<float>(b, n + 4), at<float>(b, n + 8));
+        m.uvs.emplace_back(at<float>(b, t), at<float>(b, t + 4));
+    }
+    for (std::size_t k = 0; k < m.i; ++k) m.indices.push_back(at<std::uint16_t>(b, 8 + 32 * m.v + 2 * k));
+    return m;
+}
+
+// Every triangle turns counter-clockwise around its normals: culling keeps the front.
+void expectFacingOut(const Model& m) {
+    for (std::size_t k = 0; k + 2 < m.indices.size(); k += 3) {
+        for (int c = 0; c < 3; ++c) ASSERT_LT(m.indices[k + c], m.v);
+        const glm::vec3 a = m.positions[m.indices[k]], b = m.positions[m.indices[k + 1]];
+        const glm::vec3 face = glm::cross(b - a, m.positions[m.indices[k + 2]] - a);
+        for (int c = 0; c < 3; ++c) EXPECT_GT(glm::dot(face, m.normals[m.indices[k + c]]), 0.0f) << k / 3;
+    }
+}
+
+// A cube of side 2 around the origin with a uv square per face (if asked) and outward normals.
+std::string cube(bool withUv) {
+    std::ostringstream obj;
+    obj << "v -1 -1 -1\nv 1 -1 -1\nv 1 1 -1\nv -1 1 -1\nv -1 -1 1\nv 1 -1 1\nv 1 1 1\nv -1 1 1\n"
+        << (withUv ? "vt 0 0\nvt 1 0\nvt 1 1\nvt 0 1\n" : "") << "vn 0 0 -1\nvn 0 0 1\nvn -1 0 0\nvn 1 0 0\nvn 0 -1 0\nvn 0 1 0\n";
+    const char* faces[6] = {"1432", "5678", "1584", "2376", "1265", "4873"};
+    for (int f = 0; f < 6; ++f) {
+        obj << "f";
+        for (int c = 0; c < 4; ++c) obj << " " << faces[f][c] << "/" << (withUv ? std::to_string(c + 1) : "") << "/" << f + 1;
+        obj << "\n";
+    }
+    return obj.str();
+}
+
+// n x n distinct vertices, each with its own uv.
+std::string grid(int n) {
+    std::ostringstream obj;
+    for (int k = 0; k < n * n; ++k) obj << "v " << k % n << " " << k / n << " 0\nvt 0 " << k << "\n";
+    for (int k = 1; k + n + 1 <= n * n; ++k) obj << "f " << k << "/" << k << " " << k + 1 << "/" << k + 1 << " " << k + n + 1 << "/" << k + n + 1 << "\n";
+    return obj.str();
+}
+
+// One triangle mesh used by three nodes: moved, mirrored in x, scaled inside a moved parent.
+const char* kInstances = R"({"asset":{"version":"2.0"},"scene":0,"scenes":[{"nodes":[0,1,2]}],
+"nodes":[{"mesh":0,"translation":[10,0,0]},{"mesh":0,"scale":[-1,1,1]},{"translation":[0,5,0],"children":[3]},
+{"mesh":0,"scale":[2,2,2]}],"meshes":[{"primitives":[{"attributes":{"POSITION":0,"TEXCOORD_0":1},"indices":2}]}],
+"buffers":[{"byteLength":68,"uri":"data:application/octet-stream;base64,AAAAAAAAAAAAAAAAAACAPwAAAAAAAAAAAAAAAAAAgD8AAAAAAAAAAAAAAAAAAIA/AAAAAAAAAAAAAIA/AAABAAIAAAA="}],
+"bufferViews":[{"buffer":0,"byteLength":36},{"buffer":0,"byteOffset":36,"byteLength":24},{"buffer":0,"byteOffset":60,"byteLength":6}],
+"accessors":[{"bufferView":0,"componentType":5126,"count":3,"type":"VEC3","min":[0,0,0],"max":[1,1,0]},
+{"bufferView":1,"componentType":5126,"count":3,"type":"VEC2"},{"bufferView":2,"componentType":5123,"count":3,"type":"SCALAR"}]})";
+
+struct Case {
+    const char* name;
+    const char* extension;
+    std::string input;
+    std::vector<std::string> options;       // before the input; "--info" takes no output
+    int status;
+    const char* message;                    // in its output
+    std::function<void(const Model&)> check;  // on out.bin after a success
+};
+
+void PrintTo(const Case& row, std::ostream* out) { *out << row.name; }
+
+const Case kCases[] = {
+    {"CubeWithUvGivesFourCornersAFace", ".obj", cube(true), {}, 0, "24 vertices", [](const Model& m) {
+         ASSERT_EQ(m.v, 24u);
+         EXPECT_EQ(m.i, 36u);
+         for (std::size_t k = 0; k < m.v; ++k) {
+             EXPECT_FLOAT_EQ(glm::dot(m.positions[k], m.normals[k]), 1.0f) << "outward at " << k;
+             EXPECT_TRUE(glm::all(glm::equal(glm::abs(m.uvs[k] - 0.5f), glm::vec2(0.5f)))) << k;
+         }
+         expectFacingOut(m);
+         EXPECT_THAT(run({"--info", (kDir / "out.bin").string()}).second,
+                     testing::HasSubstr("vertices: 24\nindices: 36\ntriangles: 12\nbounds: min (-1, -1, -1) "
+                                        "max (1, 1, 1)\nsize: 848 bytes"));
+     }},
+    {"ATriangleGetsItsMissingNormal", ".obj", "v 0 0 0\nv 2 0 0\nv 0 3 0\nvt 0.25 0.5\nvt 0.75 0.5\nvt 0.25 1\nf 1/1 2/2 3/3\n", {}, 0, "", [](const Model& m) {
+         EXPECT_EQ(m.positions, (std::vector<glm::vec3>{{0, 0, 0}, {2, 0, 0}, {0, 3, 0}}));
+         EXPECT_EQ(m.normals, std::vector<glm::vec3>(3, glm::vec3(0, 0, 1)));
+         EXPECT_EQ(m.uvs, (std::vector<glm::vec2>{{.25f, .5f}, {.75f, .5f}, {.25f, 1}}));
+         EXPECT_EQ(m.indices, (std::vector<std::uint16_t>{0, 1, 2}));
+     }},
+    {"AMeshWithoutUvIsRefused", ".obj", cube(false), {}, 1, "no texture coordinates in", nullptr},
+    {"AMeshWithoutUvIsProjectedWhenAsked", ".obj", cube(false), {"--generate-uv"}, 0, "", [](const Model& m) {
+         ASSERT_EQ(m.v, 24u);
+         for (const glm::vec2& uv : m.uvs) EXPECT_TRUE(glm::all(glm::lessThanEqual(glm::abs(uv - 0.5f), glm::vec2(0.5f))));
+     }},
+    {"MoreThan65536VerticesAreRefused", ".obj", grid(257), {}, 1, "more than the 65536 that 16-bit indices can address", nullptr},
+    {"NodeTransformsApplyToEveryInstance", ".gltf", kInstances, {}, 0, "", [](const Model& m) {
+         EXPECT_EQ(m.i, 9u);
+         for (glm::vec3 p : {glm::vec3(10, 0, 0), glm::vec3(11, 0, 0), glm::vec3(10, 1, 0), glm::vec3(-1, 0, 0),
+                             glm::vec3(0, 5, 0), glm::vec3(2, 5, 0), glm::vec3(0, 7, 0)})
+             EXPECT_NE(std::find(m.positions.begin(), m.positions.end(), p), m.positions.end()) << p.x << " " << p.y;
+         EXPECT_EQ(m.normals, std::vector<glm::vec3>(9, glm::vec3(0, 0, 1)));  // the mirrored one too
+         expectFacingOut(m);
+     }},
+    {"InfoRefusesAnIndexPastTheLastVertex", ".bin", std::string("\3\0\0\0\3\0\0\0", 8) + std::string(96, '\0') +
+         std::string("\0\0\1\0\3\0", 6), {"--info"}, 1, "index 2 is 3, past the last vertex", nullptr},
+    {"InfoRefusesHugeCountsInAShortFile", ".bin", std::string(8, '\xff') + "abc", {"--info"}, 1,
+     "truncated: 11 bytes, but V = 4294967295 and I = 4294967295 need 146028888038", nullptr},
+};
+
+class Converter : public testing::TestWithParam<Case> {
+protected:
+    void SetUp() override { fs::create_directories(kDir); }
+    void TearDown() override { fs::remove_all(kDir); }
+};
+
+TEST_P(Converter, Converts) {
+    const Case& row = GetParam();
+    const fs::path input = kDir / (std::string("in") + row.extension), out = kDir / "out.bin";
+    std::ofstream(input, std::ios::binary) << row.input;
+    std::ofstream(out) << "old";
+    std::vector<std::string> arguments = row.options;
+    arguments.push_back(input.string());
+    if (row.options != std::vector<std::string>{"--info"}) arguments.push_back(out.string());
+    const auto [status, output] = run(arguments);
+    ASSERT_EQ(status, row.status) << output;
+    EXPECT_THAT(output, testing::HasSubstr(row.message));
+    if (row.check) return row.check(decode(slurp(out)));
+    // A refusal leaves an earlier output as it was and writes nothing else.
+    EXPECT_EQ(slurp(out), "old");
+    EXPECT_EQ(std::distance(fs::directory_iterator(kDir), fs::directory_iterator()), 2);
+}
+
+INSTANTIATE_TEST_SUITE_P(Table, Converter, testing::ValuesIn(kCases),
+                         [](const testing::TestParamInfo<Case>& info) { return std::string(info.param.name); });
+}  // namespace
