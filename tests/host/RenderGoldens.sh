@@ -5,22 +5,14 @@
 # another grade ("other-grade") and no gem model ("no-gem").
 # usage: RenderGoldens.sh PLAYER PLUGIN JAVA WALLPAPER_TOOL TIMELINE OUTPUT_DIR
 set -euo pipefail
-player="$1" plugin="$2" java="$3" tool="$4" timeline="$5" out="$6"
-rm -rf "$out"
-mkdir -p "$out"
-"$java" "$tool" "$out/wallpaper.png" 180 320
-
-render() {
-  local name="$1" timeline="$2"
-  shift 2
-  "$player" --fixed-step --quiet --size 180x320 --fps 10 --timeline "$timeline" \
-    --image wallpaper="$out/wallpaper.png" --out "$out/$name" "$@" "$plugin" >/dev/null
-}
-
-render run "$timeline"
+player="$1" plugin="$2" timeline="$5" out="$6"
+rm -rf "$out" && mkdir -p "$out/empty-assets"
+"$3" "$4" "$out/wallpaper.png" 180 320
 grep -v touch "$timeline" > "$out/no-touch.timeline"
-render no-touch "$out/no-touch.timeline"
 sed 's/param 2 100/param 4 100/' "$timeline" > "$out/other-grade.timeline"
-render other-grade "$out/other-grade.timeline"
-mkdir -p "$out/empty-assets"
-render no-gem "$timeline" --assets "$out/empty-assets"
+for run in run:"$timeline" no-touch:"$out/no-touch.timeline" other-grade:"$out/other-grade.timeline" \
+  no-gem:"$timeline --assets $out/empty-assets"; do
+  # shellcheck disable=SC2086  # the timeline and options are words
+  "$player" --fixed-step --quiet --size 180x320 --fps 10 --image wallpaper="$out/wallpaper.png" \
+    --out "$out/${run%%:*}" --timeline ${run#*:} "$plugin" > /dev/null
+done

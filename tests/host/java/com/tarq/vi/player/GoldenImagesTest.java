@@ -2,107 +2,86 @@ package com.tarq.vi.player;
 
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static org.junit.jupiter.api.Assertions.assertNotNull;
 
 import java.awt.image.BufferedImage;
 import java.io.IOException;
 import java.nio.file.Path;
+import java.util.Arrays;
 import javax.imageio.ImageIO;
 import javax.imageio.ImageReader;
-import javax.imageio.metadata.IIOMetadataNode;
 import javax.imageio.stream.ImageInputStream;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.params.ParameterizedTest;
-import org.junit.jupiter.params.provider.ValueSource;
+import org.junit.jupiter.params.provider.CsvSource;
 
 /**
- * The sample effect rendered in fixed steps (RenderGoldens.sh, run before
- * this test) against stored pictures. The tolerance absorbs a rasteriser
- * update; the controls show that it still sees ripples gone, another grade
- * or the gem missing.
+ * The sample effect rendered in fixed steps (RenderGoldens.sh, run before this
+ * test) against stored pictures. The tolerance absorbs a rasteriser update;
+ * the controls show that it still sees the ripples gone, another grade or the gem missing.
  */
 class GoldenImagesTest {
-    private static final Path GOLDEN = Path.of(System.getProperty("vi.golden"));
-    private static final Path RENDERS = Path.of(System.getProperty("vi.renders"));
+    private final Path golden = Path.of(System.getProperty("vi.golden"));
+    private final Path renders = Path.of(System.getProperty("vi.renders"));
 
-    private static BufferedImage read(Path file) throws IOException {
+    /** Pixels more than 8 apart in a channel, or -1 for pictures of different sizes. */
+    static int differing(BufferedImage a, BufferedImage b) {
+        if (a.getWidth() != b.getWidth() || a.getHeight() != b.getHeight()) return -1;
+        int count = 0;
+        for (int y = 0; y < a.getHeight(); ++y) {
+            for (int x = 0; x < a.getWidth(); ++x) {
+                int p = a.getRGB(x, y), q = b.getRGB(x, y);
+                if (Math.abs((p >> 16 & 255) - (q >> 16 & 255)) > 8 || Math.abs((p >> 8 & 255) - (q >> 8 & 255)) > 8
+                    || Math.abs((p & 255) - (q & 255)) > 8) ++count;
+            }
+        }
+        return count;
+    }
+
+    /** The same picture: at most 0.2 % of the pixels beyond the tolerance (edges moved by a pixel). */
+    static boolean matches(BufferedImage picture, BufferedImage golden) {
+        int differing = differing(picture, golden);
+        return differing >= 0 && differing <= 0.002 * golden.getWidth() * golden.getHeight();
+    }
+
+    static BufferedImage read(Path file) throws IOException {
         BufferedImage image = ImageIO.read(file.toFile());
-        assertTrue(image != null, "not a picture: " + file);
+        assertNotNull(image, "not a picture: " + file);
         return image;
     }
 
-    private static BufferedImage rendered(String run, String frame) throws IOException {
-        return read(RENDERS.resolve(run).resolve(frame));
-    }
-
     @ParameterizedTest
-    @ValueSource(strings = {"frame-00003.png", "frame-00007.png", "frame-00011.png"})
-    void chosenFramesMatchTheirGoldens(String frame) throws IOException {
-        BufferedImage golden = read(GOLDEN.resolve(frame));
-        BufferedImage picture = rendered("run", frame);
-        assertTrue(PictureTolerance.matches(picture, golden), frame + ": "
-            + PictureTolerance.beyondTolerance(picture, golden)
-            + " pixels differ by more than " + PictureTolerance.TOLERANCE);
-    }
-
-    @ParameterizedTest
-    @ValueSource(strings = {"no-touch", "other-grade", "no-gem"})
-    void aRealChangeDoesNotMatch(String control) throws IOException {
-        BufferedImage golden = read(GOLDEN.resolve("frame-00011.png"));
-        assertFalse(PictureTolerance.matches(rendered(control, "frame-00011.png"), golden),
-            control + " passed for the golden");
-    }
-
-    @ParameterizedTest
-    @ValueSource(strings = {"frame-00000.png", "frame-00003.png", "frame-00005.png"})
-    void fixedStepRendersRepeatBitForBit(String frame) throws IOException {
-        // "other-grade" changes its grade at 0.6 s: until then it is the same
-        // render as "run", made by another process, and must be the same to the bit.
-        BufferedImage a = rendered("run", frame);
-        BufferedImage b = rendered("other-grade", frame);
-        assertEquals(a.getWidth(), b.getWidth());
-        assertArrayEquals(a.getRGB(0, 0, a.getWidth(), a.getHeight(), null, 0, a.getWidth()),
-            b.getRGB(0, 0, b.getWidth(), b.getHeight(), null, 0, b.getWidth()), frame);
+    @CsvSource({"run, frame-00003.png, true", "run, frame-00007.png, true", "run, frame-00011.png, true",
+        "no-touch, frame-00011.png, false", "other-grade, frame-00011.png, false", "no-gem, frame-00011.png, false"})
+    void framesMatchTheirGoldensAndRealChangesDoNot(String run, String frame, boolean same) throws IOException {
+        BufferedImage picture = read(renders.resolve(run).resolve(frame)), expected = read(golden.resolve(frame));
+        assertEquals(same, matches(picture, expected), run + " " + frame + ": " + differing(picture, expected) + " differ");
     }
 
     @Test
-    void theRenderHasEveryFrameASheetOfEightAndALoopingPreview() throws IOException {
-        // 1.2 s at 10 frames a second: frames 0 to 11, all of them in the preview.
-        Path run = RENDERS.resolve("run");
-        assertTrue(run.resolve("frame-00011.png").toFile().isFile());
-        assertFalse(run.resolve("frame-00012.png").toFile().exists());
-        BufferedImage sheet = read(run.resolve(Pictures.SHEET));
-        // 4 x 2 cells of a third of 180 x 320, 4 pixels apart and around.
-        assertEquals(4 * (60 + 4) + 4, sheet.getWidth());
-        assertEquals(2 * (107 + 4) + 4, sheet.getHeight());
+    void fixedStepRendersRepeatBitForBit() throws IOException {
+        // "other-grade" changes its grade at 0.6 s: until then it is the run made by another process.
+        for (int frame = 0; frame <= 5; ++frame) {
+            BufferedImage a = read(renders.resolve("run").resolve(String.format("frame-%05d.png", frame)));
+            BufferedImage b = read(renders.resolve("other-grade").resolve(String.format("frame-%05d.png", frame)));
+            assertArrayEquals(a.getRGB(0, 0, 180, 320, null, 0, 180), b.getRGB(0, 0, 180, 320, null, 0, 180), "" + frame);
+        }
+    }
 
+    @Test
+    void theRenderHasEveryFrameASheetOfEightAndAHalfSizePreview() throws IOException {
+        // 1.2 s at 10 frames a second: frames 0 to 11. The sheet: 4 x 2 cells of a third of 180 x 320, 4 pixels apart.
+        Path run = renders.resolve("run");
+        assertEquals(12, Arrays.stream(run.toFile().list()).filter(name -> name.matches("frame-\\d{5}\\.png")).count());
+        BufferedImage sheet = read(run.resolve(Pictures.SHEET));
+        assertEquals(4 * 64 + 4, sheet.getWidth());
+        assertEquals(2 * 111 + 4, sheet.getHeight());
         ImageReader reader = ImageIO.getImageReadersByFormatName("gif").next();
         try (ImageInputStream stream = ImageIO.createImageInputStream(run.resolve(Pictures.PREVIEW).toFile())) {
             reader.setInput(stream);
             assertEquals(12, reader.getNumImages(true));
             assertEquals(90, reader.getWidth(0));
             assertEquals(160, reader.getHeight(0));
-            assertEquals(1, loopExtensions(reader, 0));
-            assertEquals(0, loopExtensions(reader, 1));
-        } finally {
-            reader.dispose();
         }
-    }
-
-    /** The looping extensions (repeat for ever) in the metadata of one GIF frame. */
-    private static int loopExtensions(ImageReader reader, int index) throws IOException {
-        IIOMetadataNode root = (IIOMetadataNode) reader.getImageMetadata(index).getAsTree("javax_imageio_gif_image_1.0");
-        int count = 0;
-        var extensions = root.getElementsByTagName("ApplicationExtension");
-        for (int i = 0; i < extensions.getLength(); ++i) {
-            IIOMetadataNode extension = (IIOMetadataNode) extensions.item(i);
-            byte[] data = (byte[]) extension.getUserObject();
-            if (extension.getAttribute("applicationID").equals("NETSCAPE") && data.length == 3 && data[0] == 1
-                && data[1] == 0 && data[2] == 0) {
-                ++count;
-            }
-        }
-        return count;
     }
 }
