@@ -2,114 +2,98 @@ package com.tarq.test;
 
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertNotNull;
 import static org.junit.jupiter.api.Assertions.assertNull;
 import static org.junit.jupiter.api.Assertions.assertTrue;
 
 import com.tarq.android.visualeffect.common.Native;
 import java.io.File;
+import java.util.ArrayList;
 import java.util.List;
-import org.junit.jupiter.api.BeforeAll;
-import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
 
 /**
- * What only a real JVM shows of the host's entry points: string arrays with
- * modified-UTF-8 names, null from a failed start, the library without a
- * factory, ints through the draw call and the host's pixel array mutated in place.
+ * What only a real JVM shows of the host's entry points, called through the
+ * host's own Native class: string arrays of modified-UTF-8 names, ints through
+ * the draw call, null from a failed start, the factory kept for the same
+ * path, and the host's pixel array changed in place.
  */
 class NativeTest {
-    private static String plugin;
-    private static String pluginWithoutFactory;
-    private static String missingPlugin;
+    static {
+        // The runtime first, so that the test plug-in and TestHost.cpp bind to the one runtime Native talks to.
+        for (String library : new String[] {"runtime", "testscene", "testhost"}) System.load(System.getProperty("vi." + library));
+        makeContextCurrent();
+    }
 
+    private static final String PLUGIN = System.getProperty("vi.testscene");
     private final Native host = new Native();
 
-    @BeforeAll
-    static void loadLibrariesAndMakeAContextCurrent() {
-        TestHost.load();
-        plugin = TestHost.property("vi.testscene");
-        pluginWithoutFactory = TestHost.property("vi.nofactory");
-        missingPlugin = new File(new File(plugin).getParentFile(), "libvi_not_there.so").getPath();
-        TestHost.makeContextCurrent(64, 64);
-    }
+    /** A headless GL context current on this thread, as the host's render thread has one. */
+    static native void makeContextCurrent();
+    /** One pixel of the current framebuffer as 0xRRGGBBAA. */
+    static native int readPixel(int x, int y);
+    /** The dynamic loader's pending error, or null; reading it clears it. */
+    static native String loaderError();
 
-    @BeforeEach
-    void noSceneAndAFreshRecord() {
-        host.prehandleStop();
+    @Test
+    void aHostStartsDrawsRestartsAndFailsToStart() {
         TestScene.reset();
-    }
-
-    /** Starts the plug-in with its factory looked up afresh (a failed load forgets the open library). */
-    private String[] freshStart(int width, int height) {
-        assertNull(host.prehandleStart(missingPlugin, width, height));
-        String[] names = host.prehandleStart(plugin, width, height);
-        assertNotNull(names);
-        return names;
-    }
-
-    @Test
-    void namesComeBackAsAStringArrayAndAnEmptyListAsAnEmptyArray() {
         TestScene.setNames(new String[] {"sky", "glass", "fl\u00fcgel"});
-        assertArrayEquals(new String[] {"sky", "glass", "fl\u00fcgel"}, freshStart(540, 960));
-
-        TestScene.setNames(new String[0]);
-        String[] none = host.prehandleStart(plugin, 540, 960);
-        assertNotNull(none);
-        assertEquals(0, none.length);
-    }
-
-    @Test
-    void missingLibraryGivesNullAfterStoppingTheSceneAndLeavesTheLoaderError() {
-        freshStart(540, 960);
-        host.prehandleInitEffect();
-        TestHost.loaderError();
-        assertNull(host.prehandleStart(missingPlugin, 540, 960));
-        String error = TestHost.loaderError();
-        assertNotNull(error);
-        assertTrue(error.contains("libvi_not_there.so"), error);
-        assertFalse(TestHost.hasScene());
-        assertEquals(1, TestScene.count(TestScene.DESTROYED));
-        assertEquals(0, host.prehandleDraw());
-    }
-
-    @Test
-    void samePathKeepsTheFactoryAndALibraryWithoutOneGivesNullThenAnotherPathIsLookedUpAfresh() {
-        freshStart(540, 960);
-        // Were the same library looked up again, the first factory would create the scene.
-        TestScene.useSecondFactory();
-        assertNotNull(host.prehandleStart(plugin, 300, 400));
-        assertNull(host.prehandleStart(pluginWithoutFactory, 540, 960));
-        assertFalse(TestHost.hasScene());
-        assertNotNull(host.prehandleStart(plugin, 540, 960));
-
-        List<TestScene.Event> created = TestScene.eventsOf(TestScene.CREATED);
-        assertEquals(3, created.size());
-        assertEquals(1, created.get(0).factory);
-        assertEquals(2, created.get(1).factory);
-        assertEquals(300, created.get(1).a);
-        assertEquals(400, created.get(1).b);
-        assertEquals(1, created.get(2).factory);
-    }
-
-    @Test
-    void drawReturnsTheSceneResultUnchangedAndDrawsInTheHostContext() {
-        freshStart(64, 64);
+        assertArrayEquals(new String[] {"sky", "glass", "fl\u00fcgel"}, host.prehandleStart(PLUGIN, 64, 64));
         host.prehandleInitEffect();
         TestScene.setClearColour(true, 0.0f, 1.0f, 0.0f, 1.0f);
-        for (int result : new int[] {1, 0, -7, Integer.MIN_VALUE, Integer.MAX_VALUE}) {
+        for (int result : new int[] {1, -7, Integer.MIN_VALUE, Integer.MAX_VALUE}) {
             TestScene.setDrawResult(result);
             assertEquals(result, host.prehandleDraw());
         }
-        assertEquals(0x00FF00FF, TestHost.readPixel(5, 5));
+        assertEquals(0x00FF00FF, readPixel(5, 5), "drawn in the host's context");
+
+        // The same path again keeps the factory found first: looked up again, it would undo this.
+        TestScene.useSecondFactory();
+        TestScene.setNames(new String[0]);
+        assertArrayEquals(new String[0], host.prehandleStart(PLUGIN, 300, 400));
+        // A library without a factory and one that is not there: null, the running scene stopped.
+        assertNull(host.prehandleStart(System.getProperty("vi.nofactory"), 64, 64));
+        loaderError();
+        assertNull(host.prehandleStart(new File(new File(PLUGIN).getParentFile(), "libvi_not_there.so").getPath(), 64, 64));
+        String error = loaderError();
+        assertTrue(error != null && error.contains("libvi_not_there.so"), error);
+        assertEquals(0, host.prehandleDraw(), "no scene draws");
+        assertEquals(2, TestScene.count(TestScene.DESTROYED));
+        // Another path (the first one again) is looked up afresh.
+        host.prehandleStart(PLUGIN, 64, 64);
+        List<String> created = new ArrayList<>();
+        for (int i = 0; i < TestScene.eventCount(); ++i) {
+            int[] event = TestScene.eventInts(i);  // kind, scene, factory, width, height, ...
+            if (event[0] == TestScene.CREATED) created.add(event[2] + ": " + event[3] + " x " + event[4]);
+        }
+        assertEquals(List.of("1: 64 x 64", "2: 300 x 400", "1: 64 x 64"), created, "the factory and size of each scene");
+        host.prehandleStop();
     }
 
     @Test
-    void loadingATextureLeavesTheHostArraySwappedInPlace() {
+    void hostPixelsAreSwappedToRgbaInPlace() {
         int[] pixels = {0xFF112233, 0x80AABBCC};
         Native.loadTexture("load.example", pixels, 2, 1);
         assertArrayEquals(new int[] {0xFF332211, 0x80CCBBAA}, pixels);
-        Native.loadTexture("load.example", null, 2, 1);
+        Native.loadTexture("load.example", null, 2, 1);  // no pixels: nothing to swap, nothing to crash on
     }
+}
+
+/** The recording scene of the test plug-in (tests/scenes): its settings and what it saw. */
+final class TestScene {
+    static final int CREATED = 0;
+    static final int DESTROYED = 1;
+
+    private TestScene() {}
+
+    /** Forgets everything and restores the defaults. */
+    static native void reset();
+    static native void setNames(String[] names);
+    static native void setDrawResult(int result);
+    static native void setClearColour(boolean enabled, float red, float green, float blue, float alpha);
+    /** Puts the plug-in's second factory into the runtime's factory pointer. */
+    static native void useSecondFactory();
+    static native int eventCount();
+    static native int count(int kind);
+    static native int[] eventInts(int index);
 }
