@@ -11,7 +11,6 @@
 #include <fstream>
 #include <functional>
 #include <iterator>
-#include <sstream>
 
 #include <glm/glm.hpp>
 #include <gmock/gmock.h>
@@ -39,29 +38,23 @@ struct Model {
     std::vector<glm::vec2> uvs;
     std::vector<std::uint16_t> indices;
 };
+static_assert(sizeof(glm::vec3) == 12 && sizeof(glm::vec2) == 8, "arrays read as they lie in the file");
 
-template <class T> T at(const std::string& bytes, std::size_t offset) {
-    T value;
-    std::memcpy(&value, bytes.data() + offset, sizeof value);  // little-endian, as on the phone
-    return value;
+// Little-endian, as on the phone.
+template <class T> std::vector<T> array(const std::string& bytes, std::size_t offset, std::size_t count) {
+    std::vector<T> values(count);
+    std::memcpy(values.data(), bytes.data() + offset, count * sizeof(T));
+    return values;
 }
 
 Model decode(const std::string& b) {
-    Model m;
-    if (b.size() < 8 || b.size() != 8 + 32 * std::size_t(at<std::uint32_t>(b, 0)) + 2 * at<std::uint32_t>(b, 4)) {
+    const std::size_t v = b.size() < 8 ? 0 : array<std::uint32_t>(b, 0, 1)[0], i = b.size() < 8 ? 0 : array<std::uint32_t>(b, 4, 1)[0];
+    if (b.size() < 8 || b.size() != 8 + 32 * v + 2 * i) {
         ADD_FAILURE() << "a model file of " << b.size() << " bytes does not match its counts";
-        return m;
+        return Model();
     }
-    m.v = at<std::uint32_t>(b, 0);
-    m.i = at<std::uint32_t>(b, 4);
-    for (std::size_t k = 0; k < m.v; ++k) {
-        const std::size_t p = 8 + 12 * k, n = p + 12 * m.v, t = 8 + 24 * m.v + 8 * k;
-        m.positions.emplace_back(at<float>(b, p), at<float>(b, p + 4), at<float>(b, p + 8));
-        m.normals.emplace_back(at<float>(b, n), at<float>(b, n + 4), at<float>(b, n + 8));
-        m.uvs.emplace_back(at<float>(b, t), at<float>(b, t + 4));
-    }
-    for (std::size_t k = 0; k < m.i; ++k) m.indices.push_back(at<std::uint16_t>(b, 8 + 32 * m.v + 2 * k));
-    return m;
+    return {v, i, array<glm::vec3>(b, 8, v), array<glm::vec3>(b, 8 + 12 * v, v), array<glm::vec2>(b, 8 + 24 * v, v),
+            array<std::uint16_t>(b, 8 + 32 * v, i)};
 }
 
 // Every triangle turns counter-clockwise around its normals: culling keeps the front.
@@ -74,36 +67,20 @@ void expectFacingOut(const Model& m) {
     }
 }
 
-// A cube of side 2 around the origin with a uv square per face (if asked) and outward normals.
-std::string cube(bool withUv) {
-    std::ostringstream obj;
-    obj << "v -1 -1 -1\nv 1 -1 -1\nv 1 1 -1\nv -1 1 -1\nv -1 -1 1\nv 1 -1 1\nv 1 1 1\nv -1 1 1\n"
-        << (withUv ? "vt 0 0\nvt 1 0\nvt 1 1\nvt 0 1\n" : "") << "vn 0 0 -1\nvn 0 0 1\nvn -1 0 0\nvn 1 0 0\nvn 0 -1 0\nvn 0 1 0\n";
-    const char* faces[6] = {"1432", "5678", "1584", "2376", "1265", "4873"};
-    for (int f = 0; f < 6; ++f) {
-        obj << "f";
-        for (int c = 0; c < 4; ++c) obj << " " << faces[f][c] << "/" << (withUv ? std::to_string(c + 1) : "") << "/" << f + 1;
-        obj << "\n";
+// A mesh kept in meshes/: cubes of side 2 around the origin with outward normals, with and without
+// uv; a triangle without normals; one triangle mesh used by three glTF nodes: moved by (10, 0, 0),
+// mirrored in x, and scaled by 2 inside a parent moved by (0, 5, 0).
+std::string mesh(const std::string& name) { return slurp(fs::path(VI_CONVERTER_MESHES) / name); }
+
+// 66000 distinct vertices, three a triangle.
+std::string tooManyVertices() {
+    std::string obj;
+    for (int k = 0; k < 22000; ++k) {
+        const std::string z = " " + std::to_string(k) + "\n";
+        obj += "v 0 0" + z + "v 1 0" + z + "v 0 1" + z + "vt 0 0\nf -3/-1 -2/-1 -1/-1\n";
     }
-    return obj.str();
+    return obj;
 }
-
-// n x n distinct vertices, each with its own uv.
-std::string grid(int n) {
-    std::ostringstream obj;
-    for (int k = 0; k < n * n; ++k) obj << "v " << k % n << " " << k / n << " 0\nvt 0 " << k << "\n";
-    for (int k = 1; k + n + 1 <= n * n; ++k) obj << "f " << k << "/" << k << " " << k + 1 << "/" << k + 1 << " " << k + n + 1 << "/" << k + n + 1 << "\n";
-    return obj.str();
-}
-
-// One triangle mesh used by three nodes: moved, mirrored in x, scaled inside a moved parent.
-const char* kInstances = R"({"asset":{"version":"2.0"},"scene":0,"scenes":[{"nodes":[0,1,2]}],
-"nodes":[{"mesh":0,"translation":[10,0,0]},{"mesh":0,"scale":[-1,1,1]},{"translation":[0,5,0],"children":[3]},
-{"mesh":0,"scale":[2,2,2]}],"meshes":[{"primitives":[{"attributes":{"POSITION":0,"TEXCOORD_0":1},"indices":2}]}],
-"buffers":[{"byteLength":68,"uri":"data:application/octet-stream;base64,AAAAAAAAAAAAAAAAAACAPwAAAAAAAAAAAAAAAAAAgD8AAAAAAAAAAAAAAAAAAIA/AAAAAAAAAAAAAIA/AAABAAIAAAA="}],
-"bufferViews":[{"buffer":0,"byteLength":36},{"buffer":0,"byteOffset":36,"byteLength":24},{"buffer":0,"byteOffset":60,"byteLength":6}],
-"accessors":[{"bufferView":0,"componentType":5126,"count":3,"type":"VEC3","min":[0,0,0],"max":[1,1,0]},
-{"bufferView":1,"componentType":5126,"count":3,"type":"VEC2"},{"bufferView":2,"componentType":5123,"count":3,"type":"SCALAR"}]})";
 
 struct Case {
     const char* name;
@@ -118,7 +95,7 @@ struct Case {
 void PrintTo(const Case& row, std::ostream* out) { *out << row.name; }
 
 const Case kCases[] = {
-    {"CubeWithUvGivesFourCornersAFace", ".obj", cube(true), {}, 0, "24 vertices", [](const Model& m) {
+    {"CubeWithUvGivesFourCornersAFace", ".obj", mesh("cube.obj"), {}, 0, "24 vertices", [](const Model& m) {
          ASSERT_EQ(m.v, 24u);
          EXPECT_EQ(m.i, 36u);
          for (std::size_t k = 0; k < m.v; ++k) {
@@ -130,19 +107,16 @@ const Case kCases[] = {
                      testing::HasSubstr("vertices: 24\nindices: 36\ntriangles: 12\nbounds: min (-1, -1, -1) "
                                         "max (1, 1, 1)\nsize: 848 bytes"));
      }},
-    {"ATriangleGetsItsMissingNormal", ".obj", "v 0 0 0\nv 2 0 0\nv 0 3 0\nvt 0.25 0.5\nvt 0.75 0.5\nvt 0.25 1\nf 1/1 2/2 3/3\n", {}, 0, "", [](const Model& m) {
+    {"ATriangleGetsItsMissingNormal", ".obj", mesh("triangle-without-normals.obj"), {}, 0, "", [](const Model& m) {
          EXPECT_EQ(m.positions, (std::vector<glm::vec3>{{0, 0, 0}, {2, 0, 0}, {0, 3, 0}}));
          EXPECT_EQ(m.normals, std::vector<glm::vec3>(3, glm::vec3(0, 0, 1)));
          EXPECT_EQ(m.uvs, (std::vector<glm::vec2>{{.25f, .5f}, {.75f, .5f}, {.25f, 1}}));
          EXPECT_EQ(m.indices, (std::vector<std::uint16_t>{0, 1, 2}));
      }},
-    {"AMeshWithoutUvIsRefused", ".obj", cube(false), {}, 1, "no texture coordinates in", nullptr},
-    {"AMeshWithoutUvIsProjectedWhenAsked", ".obj", cube(false), {"--generate-uv"}, 0, "", [](const Model& m) {
-         ASSERT_EQ(m.v, 24u);
-         for (const glm::vec2& uv : m.uvs) EXPECT_TRUE(glm::all(glm::lessThanEqual(glm::abs(uv - 0.5f), glm::vec2(0.5f))));
-     }},
-    {"MoreThan65536VerticesAreRefused", ".obj", grid(257), {}, 1, "more than the 65536 that 16-bit indices can address", nullptr},
-    {"NodeTransformsApplyToEveryInstance", ".gltf", kInstances, {}, 0, "", [](const Model& m) {
+    {"AMeshWithoutUvIsRefused", ".obj", mesh("cube-without-uv.obj"), {}, 1, "no texture coordinates in", nullptr},
+    {"AMeshWithoutUvIsProjectedWhenAsked", ".obj", mesh("cube-without-uv.obj"), {"--generate-uv"}, 0, "", [](const Model& m) { EXPECT_EQ(m.v, 24u); }},
+    {"MoreThan65536VerticesAreRefused", ".obj", tooManyVertices(), {}, 1, "more than the 65536 that 16-bit indices can address", nullptr},
+    {"NodeTransformsApplyToEveryInstance", ".gltf", mesh("instances.gltf"), {}, 0, "", [](const Model& m) {
          EXPECT_EQ(m.i, 9u);
          for (glm::vec3 p : {glm::vec3(10, 0, 0), glm::vec3(11, 0, 0), glm::vec3(10, 1, 0), glm::vec3(-1, 0, 0),
                              glm::vec3(0, 5, 0), glm::vec3(2, 5, 0), glm::vec3(0, 7, 0)})
