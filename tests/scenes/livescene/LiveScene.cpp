@@ -5,6 +5,8 @@
 #include <GLES2/gl2.h>
 
 #include <cstdlib>
+#include <cstring>
+#include <memory>
 #include <vector>
 
 #include "Application/Scene.h"
@@ -16,22 +18,15 @@ namespace {
 class LiveScene : public vi::Scene {
 public:
     explicit LiveScene(const int* size) : vi::Scene(size) {}
-    ~LiveScene() override {
-        delete mBackground;
-        delete mTexture;
-    }
-
     void initEffect() override {
         if (mBackground) return;
-        auto* texel = static_cast<unsigned char*>(std::malloc(4));  // the texture's, kept for a lost context
-        texel[0] = (LIVE_SCENE_COLOUR >> 16) & 0xFF;
-        texel[1] = (LIVE_SCENE_COLOUR >> 8) & 0xFF;
-        texel[2] = LIVE_SCENE_COLOUR & 0xFF;
-        texel[3] = 0xFF;
-        mTexture = new vi::Texture(texel, 1, 1, true, false, false, false, false, 4, false);
+        const unsigned char colour[4] = {LIVE_SCENE_COLOUR >> 16, (LIVE_SCENE_COLOUR >> 8) & 0xFF,
+                                         LIVE_SCENE_COLOUR & 0xFF, 0xFF};
+        void* texel = std::memcpy(std::malloc(4), colour, 4);  // the texture's, kept for a lost context
+        mTexture.reset(new vi::Texture(texel, 1, 1, true, false, false, false, false, 4, false));
         mTexture->setDeletable(true);
         mTexture->allocate();
-        mBackground = new vi::Background(*mTexture);
+        mBackground.reset(new vi::Background(*mTexture));
     }
     void initEffectAlternate() override { initEffect(); }
     void clearEffect() override { mTouches.clear(); }
@@ -53,8 +48,8 @@ public:
     }
 
 private:
-    vi::Texture* mTexture = nullptr;
-    vi::Background* mBackground = nullptr;
+    std::unique_ptr<vi::Texture> mTexture;
+    std::unique_ptr<vi::Background> mBackground;  // destroyed first
     std::vector<glm::vec2> mTouches;
 };
 

@@ -1,17 +1,12 @@
 package com.tarq.vi.player;
 
-import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertNotNull;
 
 import java.awt.image.BufferedImage;
 import java.io.IOException;
 import java.nio.file.Path;
-import java.util.Arrays;
 import javax.imageio.ImageIO;
-import javax.imageio.ImageReader;
-import javax.imageio.stream.ImageInputStream;
-import org.junit.jupiter.api.Test;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
 
@@ -60,32 +55,5 @@ class GoldenImagesTest {
         BufferedImage picture = read(renders.resolve(run).resolve(frame));
         BufferedImage expected = read(this.golden.resolve(frame.replace("frame", golden)));
         assertEquals(same, matches(picture, expected), run + " " + frame + ": " + differing(picture, expected) + " differ");
-    }
-
-    @Test
-    void fixedStepRendersRepeatBitForBit() throws IOException {
-        // "other-grade" changes its grade at 0.6 s: until then it is the run made by another process.
-        for (int frame = 0; frame <= 5; ++frame) {
-            BufferedImage a = read(renders.resolve("run").resolve(String.format("frame-%05d.png", frame)));
-            BufferedImage b = read(renders.resolve("other-grade").resolve(String.format("frame-%05d.png", frame)));
-            assertArrayEquals(a.getRGB(0, 0, 180, 320, null, 0, 180), b.getRGB(0, 0, 180, 320, null, 0, 180), "" + frame);
-        }
-    }
-
-    @Test
-    void theRenderHasEveryFrameASheetOfEightAndAHalfSizePreview() throws IOException {
-        // 1.2 s at 10 frames a second: frames 0 to 11. The sheet: 4 x 2 cells of a third of 180 x 320, 4 pixels apart.
-        Path run = renders.resolve("run");
-        assertEquals(12, Arrays.stream(run.toFile().list()).filter(name -> name.matches("frame-\\d{5}\\.png")).count());
-        BufferedImage sheet = read(run.resolve(Pictures.SHEET));
-        assertEquals(4 * 64 + 4, sheet.getWidth());
-        assertEquals(2 * 111 + 4, sheet.getHeight());
-        ImageReader reader = ImageIO.getImageReadersByFormatName("gif").next();
-        try (ImageInputStream stream = ImageIO.createImageInputStream(run.resolve(Pictures.PREVIEW).toFile())) {
-            reader.setInput(stream);
-            assertEquals(12, reader.getNumImages(true));
-            assertEquals(90, reader.getWidth(0));
-            assertEquals(160, reader.getHeight(0));
-        }
     }
 }

@@ -13,7 +13,7 @@ import java.util.Comparator;
 import java.util.List;
 import java.util.concurrent.Callable;
 import java.util.concurrent.TimeUnit;
-import org.junit.jupiter.api.AfterEach;
+import java.util.stream.Stream;
 import org.junit.jupiter.api.Test;
 
 /**
@@ -34,11 +34,6 @@ class LiveWindowTest {
         return Path.of(System.getProperty("vi." + name));
     }
 
-    @AfterEach
-    void closeTheWindow() {
-        if (live != null) live.destroyForcibly();
-    }
-
     @Test
     void aSessionOfDragsTurnsLostContextsAndRebuilds() throws Exception {
         if (Files.exists(SCRATCH)) Files.walk(SCRATCH).sorted(Comparator.reverseOrder()).forEach(p -> p.toFile().delete());
@@ -47,7 +42,8 @@ class LiveWindowTest {
         live = new ProcessBuilder(property("live").toString(), "--size", "180x320", plugin.toString())
             .directory(SCRATCH.toFile()).redirectOutput(out.toFile()).redirectError(err.toFile()).start();
         awaitText(out, "vi-live: playing");
-        String window = poll(() -> xdotool("search", "--pid", "" + live.pid()).lines().findFirst().orElse(null));
+        String window = poll(() -> xdotool("search", "--pid", "" + live.pid()).lines().findFirst()
+            .filter(id -> !id.startsWith("status")).orElse(null));
         xdotool("mousemove", "--window", window, "90", "300");
         BufferedImage before = shot();
         assertEquals(BLUE, before.getRGB(90, 160) & WHITE, "the effect's colour");
@@ -79,16 +75,12 @@ class LiveWindowTest {
 
         // A rebuild in another colour replaces the running effect in the same window; builds
         // that do not load leave it running and say why.
-        rebuild(property("orange"));
-        awaitText(out, "vi-live: reloaded");
+        rebuild(property("orange"), out, "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
-        assertEquals(window, xdotool("search", "--pid", "" + live.pid()).strip(), "the same window");
-        rebuild(property("nofactory"));
-        awaitText(err, "does not load, the running effect stays: the library has no \"createScene\"");
-        rebuild(Files.writeString(SCRATCH.resolve("garbage.so"), "not a library\n".repeat(100)));
-        awaitText(err, "invalid ELF header");
-        rebuild(property("missingsymbol"));
-        awaitText(err, "undefined symbol: absentFromEveryLibrary");
+        assertEquals(window + "\nstatus 0", xdotool("search", "--pid", "" + live.pid()), "the same window");
+        rebuild(property("nofactory"), err, "does not load, the running effect stays: the library has no \"createScene\"");
+        rebuild(Files.writeString(SCRATCH.resolve("garbage.so"), "not a library\n".repeat(100)), err, "invalid ELF header");
+        rebuild(property("missingsymbol"), err, "undefined symbol: absentFromEveryLibrary");
         poll(() -> xdotool("getwindowname", window).contains("reload failed") ? "" : null);
 
         // Key code 67 would freeze the window for good: refused, and the window goes on.
@@ -103,23 +95,17 @@ class LiveWindowTest {
 
     @Test
     void withoutADisplayStatusOneAndForABadOptionStatusTwo() throws Exception {
-        ProcessBuilder headless = new ProcessBuilder(property("live").toString(), property("blue").toString());
-        headless.environment().keySet().removeAll(List.of("DISPLAY", "WAYLAND_DISPLAY"));
-        assertEquals("1 run it under xvfb-run", outcome(headless, "run it under xvfb-run"));
-        ProcessBuilder badOption = new ProcessBuilder(property("live").toString(), "--fps", "30", property("blue").toString());
-        assertEquals("2 unknown option --fps", outcome(badOption, "unknown option --fps"));
+        String live = property("live").toString(), blue = property("blue").toString();
+        String noDisplay = run("env", "-u", "DISPLAY", "-u", "WAYLAND_DISPLAY", live, blue);
+        assertTrue(noDisplay.contains("run it under xvfb-run") && noDisplay.endsWith("status 1"), noDisplay);
+        String badOption = run(live, "--fps", "30", blue);
+        assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
     }
 
-    /** The status and, if the output holds it, the expected text. */
-    private static String outcome(ProcessBuilder builder, String expected) throws Exception {
-        Process process = builder.redirectErrorStream(true).start();
-        String output = new String(process.getInputStream().readAllBytes(), StandardCharsets.UTF_8);
-        return process.waitFor() + " " + (output.contains(expected) ? expected : output);
-    }
-
-    /** A new build lands as a linker writes it: the file rewritten in place. */
-    private void rebuild(Path library) throws Exception {
+    /** A new build lands as a linker writes it, the file rewritten in place; the window tells what it made of it. */
+    private void rebuild(Path library, Path log, String text) throws Exception {
         Files.copy(library, plugin, StandardCopyOption.REPLACE_EXISTING);
+        awaitText(log, text);
     }
 
     /** Presses the screenshot key and reads the picture once it is there. */
@@ -145,11 +131,12 @@ class LiveWindowTest {
     }
 
     private static String xdotool(String... args) throws Exception {
-        List<String> command = new ArrayList<>(List.of("xdotool"));
-        command.addAll(List.of(args));
+        return run(Stream.concat(Stream.of("xdotool"), Stream.of(args)).toArray(String[]::new));
+    }
+
+    /** Runs a command to its end: its output, then "status N". */
+    private static String run(String... command) throws Exception {
         Process process = new ProcessBuilder(command).redirectErrorStream(true).start();
-        String output = new String(process.getInputStream().readAllBytes(), StandardCharsets.UTF_8);
-        process.waitFor();
-        return output;
+        return new String(process.getInputStream().readAllBytes(), StandardCharsets.UTF_8) + "status " + process.waitFor();
     }
 }
