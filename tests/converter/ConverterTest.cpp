@@ -48,8 +48,9 @@ template <class T> std::vector<T> array(const std::string& bytes, std::size_t of
 }
 
 Model decode(const std::string& b) {
-    const std::size_t v = b.size() < 8 ? 0 : array<std::uint32_t>(b, 0, 1)[0], i = b.size() < 8 ? 0 : array<std::uint32_t>(b, 4, 1)[0];
-    if (b.size() < 8 || b.size() != 8 + 32 * v + 2 * i) {
+    const std::vector<std::uint32_t> counts = array<std::uint32_t>(b + std::string(8, '\0'), 0, 2);
+    const std::size_t v = counts[0], i = counts[1];
+    if (b.size() != 8 + 32 * v + 2 * i) {
         ADD_FAILURE() << "a model file of " << b.size() << " bytes does not match its counts";
         return Model();
     }

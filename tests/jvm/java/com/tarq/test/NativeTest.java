@@ -1,9 +1,6 @@
 package com.tarq.test;
 
-import static org.junit.jupiter.api.Assertions.assertArrayEquals;
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertNull;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static org.junit.jupiter.api.Assertions.*;
 
 import com.tarq.android.visualeffect.common.Native;
 import java.io.File;
@@ -20,7 +17,9 @@ import org.junit.jupiter.api.Test;
 class NativeTest {
     static {
         // The runtime first, so that the test plug-in and TestHost.cpp bind to the one runtime Native talks to.
-        for (String library : new String[] {"runtime", "testscene", "testhost"}) System.load(System.getProperty("vi." + library));
+        for (String library : new String[] {"runtime", "testscene", "testhost"}) {
+            System.load(System.getProperty("vi." + library));
+        }
         makeContextCurrent();
     }
 

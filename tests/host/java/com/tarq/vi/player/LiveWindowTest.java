@@ -1,14 +1,12 @@
 package com.tarq.vi.player;
 
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static org.junit.jupiter.api.Assertions.*;
 
 import java.awt.image.BufferedImage;
 import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.nio.file.StandardCopyOption;
-import java.util.ArrayList;
 import java.util.Comparator;
 import java.util.List;
 import java.util.concurrent.Callable;
@@ -35,11 +33,18 @@ class LiveWindowTest {
     }
 
     @Test
-    void aSessionOfDragsTurnsLostContextsAndRebuilds() throws Exception {
+    void oneSessionAsAnAuthorKeepsTheWindowOpen() throws Exception {
         if (Files.exists(SCRATCH)) Files.walk(SCRATCH).sorted(Comparator.reverseOrder()).forEach(p -> p.toFile().delete());
         Files.createDirectories(SCRATCH);
         Files.copy(property("blue"), plugin);
-        live = new ProcessBuilder(property("live").toString(), "--size", "180x320", plugin.toString())
+        // Without a display, status 1 and a hint; for a bad option, status 2.
+        String viLive = property("live").toString();
+        String noDisplay = run("env", "-u", "DISPLAY", "-u", "WAYLAND_DISPLAY", viLive, plugin.toString());
+        assertTrue(noDisplay.contains("run it under xvfb-run") && noDisplay.endsWith("status 1"), noDisplay);
+        String badOption = run(viLive, "--fps", "30", plugin.toString());
+        assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
+
+        live = new ProcessBuilder(viLive, "--size", "180x320", plugin.toString())
             .directory(SCRATCH.toFile()).redirectOutput(out.toFile()).redirectError(err.toFile()).start();
         awaitText(out, "vi-live: playing");
         String window = poll(() -> xdotool("search", "--pid", "" + live.pid()).lines().findFirst()
@@ -49,10 +54,9 @@ class LiveWindowTest {
         assertEquals(BLUE, before.getRGB(90, 160) & WHITE, "the effect's colour");
 
         // A drag paints along its path and changes nothing farther than 8 pixels from it.
-        List<String> drag = new ArrayList<>(List.of("mousemove", "--window", window, "40", "100", "mousedown", "1"));
-        for (int x = 44; x <= 140; x += 4) drag.addAll(List.of("mousemove", "--window", window, "" + x, "100"));
-        drag.addAll(List.of("mouseup", "1"));
-        xdotool(drag.toArray(String[]::new));
+        StringBuilder drag = new StringBuilder("mousemove --window " + window + " 40 100 mousedown 1");
+        for (int x = 44; x <= 140; x += 4) drag.append(" mousemove --window ").append(window).append(" " + x + " 100");
+        xdotool((drag + " mouseup 1").split(" "));
         BufferedImage painted = shot();
         for (int y = 0; y < 320; ++y) {
             for (int x = 0; x < 180; ++x) {
@@ -91,15 +95,6 @@ class LiveWindowTest {
         xdotool("key", "q");
         assertTrue(live.waitFor(20, TimeUnit.SECONDS), "q did not close the window");
         assertEquals(0, live.exitValue(), Files.readString(err));
-    }
-
-    @Test
-    void withoutADisplayStatusOneAndForABadOptionStatusTwo() throws Exception {
-        String live = property("live").toString(), blue = property("blue").toString();
-        String noDisplay = run("env", "-u", "DISPLAY", "-u", "WAYLAND_DISPLAY", live, blue);
-        assertTrue(noDisplay.contains("run it under xvfb-run") && noDisplay.endsWith("status 1"), noDisplay);
-        String badOption = run(live, "--fps", "30", blue);
-        assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
     }
 
     /** A new build lands as a linker writes it, the file rewritten in place; the window tells what it made of it. */
