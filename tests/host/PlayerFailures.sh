@@ -6,8 +6,7 @@
 set -uo pipefail
 player="$1" plugin="$2" nofactory="$3"
 rm -rf "$4" && mkdir -p "$4" && cd "$4" || exit 1
-echo "not a picture" > broken.png
-echo garbage > libgarbage.so
+echo "not a picture" | tee broken.png > libgarbage.so
 failures=0 n=0 rows=0
 fail() { echo "FAIL ($args): $*"; cat stderr.txt; failures=$((failures + 1)); }
 

@@ -28,8 +28,6 @@ public:
         mTexture->allocate();
         mBackground.reset(new vi::Background(*mTexture));
     }
-    void initEffectAlternate() override { initEffect(); }
-    void clearEffect() override { mTouches.clear(); }
     void touchDown(const glm::vec2& position) override { mTouches.push_back(position); }
     void touchMove(const glm::vec2& position) override { mTouches.push_back(position); }
 

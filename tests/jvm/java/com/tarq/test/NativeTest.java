@@ -52,7 +52,6 @@ class NativeTest {
         assertArrayEquals(new String[0], host.prehandleStart(PLUGIN, 300, 400));
         // A library without a factory and one that is not there: null, the running scene stopped.
         assertNull(host.prehandleStart(System.getProperty("vi.nofactory"), 64, 64));
-        loaderError();
         assertNull(host.prehandleStart(new File(new File(PLUGIN).getParentFile(), "libvi_not_there.so").getPath(), 64, 64));
         String error = loaderError();
         assertTrue(error != null && error.contains("libvi_not_there.so"), error);
@@ -67,7 +66,6 @@ class NativeTest {
         }
         assertEquals(List.of("made by 1 at 64 x 64", "destroyed", "made by 2 at 300 x 400", "destroyed",
             "made by 1 at 64 x 64"), lives);
-        host.prehandleStop();
 
         // The host's pixels, ARGB ints, are swapped to RGBA bytes in its own array.
         int[] pixels = {0xFF112233, 0x80AABBCC};
