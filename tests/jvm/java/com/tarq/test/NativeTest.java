@@ -68,11 +68,11 @@ class NativeTest {
         assertEquals(List.of("made by 1 at 64 x 64", "destroyed", "made by 2 at 300 x 400", "destroyed",
             "made by 1 at 64 x 64"), lives);
 
-        // The host's pixels, ARGB ints, are swapped to RGBA bytes in its own array: a block of four, then one.
-        int[] pixels = {0xFF112233, 0x80AABBCC, 0x01020304, 0x7F8E9DAC, 0x00FFEEDD};
-        Native.loadTexture("load.example", pixels, 5, 1);
-        assertArrayEquals(new int[] {0xFF332211, 0x80CCBBAA, 0x01040302, 0x7FAC9D8E, 0x00DDEEFF}, pixels);
-        Native.loadTexture("load.example", null, 5, 1);  // no pixels: nothing to swap, nothing to crash on
+        // The host's pixels, ARGB ints, are swapped to RGBA bytes in its own array: a block of four, then two.
+        int[] pixels = {0xFF112233, 0x80AABBCC, 0x01020304, 0x7F8E9DAC, 0x00FFEEDD, 0x10203040};
+        Native.loadTexture("load.example", pixels, 6, 1);
+        assertArrayEquals(new int[] {0xFF332211, 0x80CCBBAA, 0x01040302, 0x7FAC9D8E, 0x00DDEEFF, 0x10403020}, pixels);
+        Native.loadTexture("load.example", null, 6, 1);  // no pixels: nothing to swap, nothing to crash on
     }
 }
 
