@@ -53,7 +53,7 @@ class NativeTest {
         // A library without a factory and one that is not there: null, the running scene stopped.
         assertNull(host.prehandleStart(System.getProperty("vi.nofactory"), 64, 64));
         loaderError();  // read and cleared: what comes next is the failed open's
-        assertNull(host.prehandleStart(new File(new File(PLUGIN).getParentFile(), "libvi_not_there.so").getPath(), 64, 64));
+        assertNull(host.prehandleStart(new File(PLUGIN).getParent() + "/libvi_not_there.so", 64, 64));
         String error = loaderError();
         assertTrue(error != null && error.contains("libvi_not_there.so"), error);
         assertEquals(0, host.prehandleDraw(), "no scene draws");
@@ -80,8 +80,6 @@ class NativeTest {
 final class TestScene {
     static final int CREATED = 0;
     static final int DESTROYED = 1;
-
-    private TestScene() {}
 
     /** Forgets everything and restores the defaults. */
     static native void reset();

@@ -1,13 +1,12 @@
 package com.tarq.vi.player;
 
+import static java.nio.charset.StandardCharsets.UTF_8;
 import static org.junit.jupiter.api.Assertions.*;
 
 import java.awt.image.BufferedImage;
-import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.nio.file.StandardCopyOption;
-import java.util.Comparator;
 import java.util.List;
 import java.util.concurrent.Callable;
 import java.util.concurrent.TimeUnit;
@@ -22,9 +21,7 @@ import org.junit.jupiter.api.Test;
  */
 class LiveWindowTest {
     private static final int BLUE = 0x2050E0, ORANGE = 0xF08020, WHITE = 0xFFFFFF;
-    private static final Path SCRATCH = property("scratch");
-    private final Path plugin = SCRATCH.resolve("libscene.so"), out = SCRATCH.resolve("out.txt");
-    private final Path err = SCRATCH.resolve("err.txt");
+    private Path scratch, plugin, out, err;
     private Process live;
     private int shots;
 
@@ -34,8 +31,10 @@ class LiveWindowTest {
 
     @Test
     void oneSessionAsAnAuthorKeepsTheWindowOpen() throws Exception {
-        if (Files.exists(SCRATCH)) Files.walk(SCRATCH).sorted(Comparator.reverseOrder()).forEach(p -> p.toFile().delete());
-        Files.createDirectories(SCRATCH);
+        scratch = Files.createTempDirectory(Files.createDirectories(property("scratch")), "session-");
+        plugin = scratch.resolve("libscene.so");
+        out = scratch.resolve("out.txt");
+        err = scratch.resolve("err.txt");
         Files.copy(property("blue"), plugin);
         // Without a display, status 1 and a hint; for a bad option, status 2.
         String viLive = property("live").toString();
@@ -45,7 +44,7 @@ class LiveWindowTest {
         assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
 
         live = new ProcessBuilder(viLive, "--size", "180x320", plugin.toString())
-            .directory(SCRATCH.toFile()).redirectOutput(out.toFile()).redirectError(err.toFile()).start();
+            .directory(scratch.toFile()).redirectOutput(out.toFile()).redirectError(err.toFile()).start();
         awaitText(out, "vi-live: playing");
         String window = poll(() -> xdotool("search", "--pid", "" + live.pid()).lines().findFirst()
             .filter(id -> !id.startsWith("status")).orElse(null));
@@ -67,8 +66,8 @@ class LiveWindowTest {
 
         // The orientation key turns the frame, drawn all over, and back.
         xdotool("key", "o");
-        BufferedImage turned = shot();
-        assertEquals(List.of(320, 180, BLUE), List.of(turned.getWidth(), turned.getHeight(), turned.getRGB(300, 170) & WHITE));
+        BufferedImage w = shot();
+        assertEquals(List.of(320, 180, BLUE), List.of(w.getWidth(), w.getHeight(), w.getRGB(300, 170) & WHITE));
         xdotool("key", "o");
         assertTrue(GoldenImagesTest.matches(shot(), painted), "turned back");
 
@@ -82,13 +81,13 @@ class LiveWindowTest {
         rebuild(property("orange"), out, "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
         assertEquals(window + "\nstatus 0", xdotool("search", "--pid", "" + live.pid()), "the same window");
-        rebuild(property("nofactory"), err, "does not load, the running effect stays: the library has no \"createScene\"");
-        rebuild(Files.writeString(SCRATCH.resolve("garbage.so"), "not a library\n".repeat(100)), err, "invalid ELF header");
+        rebuild(property("nofactory"), err, "the running effect stays: the library has no \"createScene\"");
+        rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), err, "invalid ELF header");
         rebuild(property("missingsymbol"), err, "undefined symbol: absentFromEveryLibrary");
         poll(() -> xdotool("getwindowname", window).contains("reload failed") ? "" : null);
 
         // Key code 67 would freeze the window for good: refused, and the window goes on.
-        live.getOutputStream().write("keycode 67\n".getBytes(StandardCharsets.UTF_8));
+        live.getOutputStream().write("keycode 67\n".getBytes(UTF_8));
         live.getOutputStream().flush();
         awaitText(err, "key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
@@ -105,7 +104,7 @@ class LiveWindowTest {
 
     /** Presses the screenshot key and reads the picture once it is there. */
     private BufferedImage shot() throws Exception {
-        Path file = SCRATCH.resolve(String.format("live-%03d.png", ++shots));
+        Path file = scratch.resolve(String.format("live-%03d.png", ++shots));
         xdotool("key", "p");
         poll(() -> Files.exists(file) ? file : null);
         return GoldenImagesTest.read(file);
@@ -117,7 +116,7 @@ class LiveWindowTest {
 
     /** Polls until the probe gives a value; fails at the deadline, or when the window closes. */
     private <T> T poll(Callable<T> probe) throws Exception {
-        for (long deadline = System.currentTimeMillis() + 20_000; System.currentTimeMillis() < deadline; Thread.sleep(20)) {
+        for (long end = System.currentTimeMillis() + 20_000; System.currentTimeMillis() < end; Thread.sleep(20)) {
             T value = probe.call();
             if (value != null) return value;
             assertTrue(live.isAlive(), "the window closed: " + Files.readString(err));
@@ -132,6 +131,6 @@ class LiveWindowTest {
     /** Runs a command to its end: its output, then "status N". */
     private static String run(String... command) throws Exception {
         Process process = new ProcessBuilder(command).redirectErrorStream(true).start();
-        return new String(process.getInputStream().readAllBytes(), StandardCharsets.UTF_8) + "status " + process.waitFor();
+        return new String(process.getInputStream().readAllBytes(), UTF_8) + "status " + process.waitFor();
     }
 }
