@@ -63,6 +63,7 @@ std::vector<Call> sequence(std::uint64_t seed, int index) {
     for (std::size_t i = 0; i < calls.size(); ++i) {
         Call& call = calls[i];
         for (int pick = between(0, 99); pick >= kKinds[call.kind].weight;) pick -= kKinds[call.kind++].weight;
+        // Mostly a frame right after a context change: the one compared with the frame before it.
         if (i && calls[i - 1].kind >= Switch && calls[i - 1].kind < Plain && between(0, 3)) call.kind = Draw;
         int* value = call.v;
         for (const Range& range : kKinds[call.kind].ranges) *value++ = between(range.first, range.second);
