@@ -1,7 +1,6 @@
-// Programs on a real context: the build sequence, destruction, and the two
-// fatal exits.
+// Programs on a real context: the build sequence, rebuilding after a lost
+// context, destruction, and the two fatal exits the host tells apart.
 #include <gtest/gtest.h>
-#include <gmock/gmock.h>
 
 #include <unistd.h>
 
@@ -15,9 +14,7 @@
 #include "GlRecorder.h"
 #include "Render/ShaderProgram.h"
 
-using vitest::GlContext;
 using vitest::GlRecorder;
-using vitest::GlRecording;
 
 namespace {
 
@@ -29,83 +26,50 @@ const char* const kFragment =
     "precision mediump float;\n"
     "varying vec2 vValue;\n"
     "void main() { gl_FragColor = vec4(vValue, 0.0, 1.0); }\n";
-const char* const kFragmentSyntaxError =
-    "precision mediump float;\n"
-    "void main() { gl_FragColor = vec4(1.0) }\n";
-// Compiles on its own, but its input does not match the vertex output.
-const char* const kFragmentMismatchedVarying =
-    "precision mediump float;\n"
-    "varying vec3 vValue;\n"
-    "void main() { gl_FragColor = vec4(vValue, 1.0); }\n";
 
-GLint programParameter(GLuint program, GLenum name) {
-    GLint value = -1;
-    glGetProgramiv(program, name, &value);
-    return value;
-}
+using Args = std::vector<double>;
 
-// Exit handler of a death test's child: the shader calls made, then how many
-// bytes reached standard output.
+// Exit handler of a death test's child: the calls made (shaders marked by
+// kind), then how many bytes reached standard output.
 std::FILE* gStdoutCapture = nullptr;
-GLuint gVertexShader = 0;
 
-void printShaderCallsAndStdout() {
+void printCallsAndStdout() {
     std::string line = "\ncalls:";
+    double vertexShader = -1;
     for (const vitest::GlCall& call : GlRecorder::calls()) {
         line += ' ' + call.name;
-        if (call.name == "glCreateShader") {
-            if (gVertexShader == 0 && call.args[0] == GL_VERTEX_SHADER) gVertexShader = GLuint(call.args[1]);
-            line += call.args[0] == GL_VERTEX_SHADER ? "(vertex)" : "(fragment)";
-        }
-        if (call.name == "glDeleteShader") line += GLuint(call.args[0]) == gVertexShader ? "(vertex)" : "(fragment)";
+        if (call.name == "glCreateShader" && call.args[0] == GL_VERTEX_SHADER) vertexShader = call.args[1];
+        if (call.name == "glCreateShader" || call.name == "glDeleteShader")
+            line += call.args[call.name == "glCreateShader"] == vertexShader ? "(vertex)" : "(fragment)";
     }
     std::fflush(stdout);
     std::fprintf(stderr, "%s\nstdout bytes: %ld\n", line.c_str(), std::ftell(gStdoutCapture));
 }
 
-// In the child: record the shader calls, send standard output to a file we
-// can measure, and print the report and the calls at exit.
-void watchTheExit() {
+void buildProgramAndWatchTheExit(const char* fragment) {
+    vitest::GlContext gl(8, 8);
     std::fflush(stdout);
     gStdoutCapture = std::tmpfile();
     dup2(fileno(gStdoutCapture), STDOUT_FILENO);
-    std::atexit(printShaderCallsAndStdout);
+    std::atexit(printCallsAndStdout);
     vitest::printFatalReportAtExit();
     GlRecorder::start();
+    vi::ShaderProgram program(kVertex, fragment);
 }
 
-void buildProgramAndWatchTheExit(const char* vertex, const char* fragment) {
-    GlContext gl(8, 8);
-    watchTheExit();
-    vi::ShaderProgram program(vertex, fragment);
+// The driver's info log between quotes, the location block, then the calls.
+std::string report(const std::string& infoLog, const std::string& function, int line, const std::string& calls) {
+    return "^\"" + infoLog + "\"\nIn file : \"/[^\"]*/Render/ShaderProgram\\.cpp\"\nIn function : \"" + function +
+           "\"\nIn line : " + std::to_string(line) + "\ncalls: " + calls + "\nstdout bytes: 0\n$";
 }
-
-// The detail is the driver's info log between quotes, then the location block.
-std::string reportPattern(const std::string& infoLog, const std::string& function, int line) {
-    const std::string file = "In file : \"/[^\"]*/Render/ShaderProgram\\.cpp\"\n";
-    return "^\"" + infoLog + "\"\n" + file + "In function : \"" + function + "\"\n" +
-           "In line : " + std::to_string(line) + "\ncalls: ";
-}
-
-class ShaderProgramDeath : public ::testing::Test {
-protected:
-    // A fresh process for each child: a forked copy of a process with a live
-    // GL driver is not safe to use.
-    void SetUp() override { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
-};
 
 }  // namespace
 
-TEST(ShaderProgram, BuildsBothShadersThenLinksAndKeepsNoShaderObjects) {
-    GlContext gl(8, 8);
-    GlRecording recording;
-    vi::ShaderProgram program(kVertex, kFragment);
-    GlRecorder::stop();
-
-    EXPECT_EQ(programParameter(program.program, GL_LINK_STATUS), GL_TRUE);
-    EXPECT_EQ(programParameter(program.program, GL_ATTACHED_SHADERS), 0);
-
-    // No validity probe: there was no name to probe.
+TEST(ShaderProgram, BuildsBothShadersLinksKeepsNoShaderAndUnbindsBeforeDeletion) {
+    vitest::GlContext gl(8, 8);
+    vitest::GlRecording recording;
+    auto* program = new vi::ShaderProgram(kVertex, kFragment);
+    const double name = program->program;
     ASSERT_EQ(GlRecorder::names(),
               (std::vector<std::string>{"glCreateShader", "glShaderSource", "glCompileShader", "glGetShaderiv",
                                         "glCreateShader", "glShaderSource", "glCompileShader", "glGetShaderiv",
@@ -113,70 +77,60 @@ TEST(ShaderProgram, BuildsBothShadersThenLinksAndKeepsNoShaderObjects) {
                                         "glDetachShader", "glDetachShader", "glDeleteShader", "glDeleteShader",
                                         "glGetProgramiv"}));
     const std::vector<vitest::GlCall> c = GlRecorder::calls();
-    const double vertexShader = c[0].args[1], fragmentShader = c[4].args[1];
+    const double vertex = c[0].args[1], fragment = c[4].args[1];
     EXPECT_EQ(c[0].args[0], GL_VERTEX_SHADER);
     EXPECT_EQ(c[5].text, kFragment);
-    // Attach, detach and delete: vertex first each time.
-    for (int i : {9, 12}) EXPECT_EQ(c[i].args, (std::vector<double>{double(program.program), vertexShader}));
-    for (int i : {10, 13}) EXPECT_EQ(c[i].args, (std::vector<double>{double(program.program), fragmentShader}));
-    EXPECT_EQ(c[14].args[0], vertexShader);
-}
+    for (int i : {9, 12}) EXPECT_EQ(c[i].args, (Args{name, vertex}));
+    for (int i : {10, 13}) EXPECT_EQ(c[i].args, (Args{name, fragment}));
+    EXPECT_EQ(c[14].args[0], vertex);
+    GLint linked = 0;
+    glGetProgramiv(program->program, GL_LINK_STATUS, &linked);
+    EXPECT_EQ(linked, GL_TRUE);
 
-TEST(ShaderProgram, DestructionUnbindsTheCurrentProgramBeforeDeletingIt) {
-    GlContext gl(8, 8);
-    auto* program = new vi::ShaderProgram(kVertex, kFragment);
-    const GLuint name = program->program;
-    glUseProgram(name);
-    GlRecording recording;
+    glUseProgram(program->program);
+    GlRecorder::start();
     delete program;
-    GlRecorder::stop();
-    const std::vector<vitest::GlCall> calls = GlRecorder::calls();
     ASSERT_EQ(GlRecorder::names(), (std::vector<std::string>{"glUseProgram", "glDeleteProgram"}));
-    EXPECT_EQ(calls[0].args[0], 0);
-    EXPECT_EQ(calls[1].args[0], name);
-    EXPECT_FALSE(glIsProgram(name));
+    EXPECT_EQ(GlRecorder::calls()[0].args[0], 0);
+    EXPECT_EQ(GlRecorder::calls()[1].args[0], name);
 }
 
-TEST_F(ShaderProgramDeath, FragmentSyntaxErrorExits88AfterTheVertexShaderCompiled) {
-    // The vertex shader is compiled and kept; only the failing shader is deleted.
-    EXPECT_EXIT(buildProgramAndWatchTheExit(kVertex, kFragmentSyntaxError), ::testing::ExitedWithCode(88),
-                ::testing::MatchesRegex(reportPattern("0:2\\([0-9]+\\): error: .+", "compileShader", 88) +
-                                        "glCreateShader\\(vertex\\) glShaderSource glCompileShader glGetShaderiv "
-                                        "glCreateShader\\(fragment\\) glShaderSource glCompileShader glGetShaderiv "
-                                        "glGetShaderInfoLog glDeleteShader\\(fragment\\)\n"
-                                        "stdout bytes: 0\n$"));
-}
-
-TEST_F(ShaderProgramDeath, ShadersThatCompileButDoNotLinkExit67) {
-    EXPECT_EXIT(buildProgramAndWatchTheExit(kVertex, kFragmentMismatchedVarying), ::testing::ExitedWithCode(67),
-                ::testing::MatchesRegex(reportPattern(".*vValue.+", "init", 67) +
-                                        ".* glLinkProgram glDetachShader glDetachShader glDeleteShader\\(vertex\\) "
-                                        "glDeleteShader\\(fragment\\) glGetProgramiv glGetProgramInfoLog "
-                                        "glDeleteProgram\n"
-                                        "stdout bytes: 0\n$"));
-}
-
-TEST(ShaderProgram, InitInTheSameContextBuildsNothing) {
-    GlContext gl(8, 8);
+TEST(ShaderProgram, InitRebuildsOnlyAfterTheContextWasReplaced) {
+    vitest::GlContext gl(8, 8);
     vi::ShaderProgram program(kVertex, kFragment);
-    const GLuint name = program.program;
-    GlRecording recording;
+    vitest::GlRecording recording;
     program.init();
-    program.init();
-    EXPECT_EQ(GlRecorder::names(), (std::vector<std::string>{"glIsProgram", "glIsProgram"}));
-    EXPECT_EQ(program.program, name);
-}
+    EXPECT_EQ(GlRecorder::names(), std::vector<std::string>{"glIsProgram"});
 
-TEST(ShaderProgram, InitAfterTheContextWasReplacedBuildsAndStoresANewProgram) {
-    GlContext gl(8, 8);
-    vi::ShaderProgram program(kVertex, kFragment);
     gl.recreate();
-    ASSERT_FALSE(glIsProgram(program.program));
-
-    GlRecording recording;
+    GlRecorder::start();
     program.init();
-    GlRecorder::stop();
     ASSERT_EQ(GlRecorder::count("glCreateProgram"), 1);
     EXPECT_EQ(program.program, GlRecorder::callsNamed("glCreateProgram")[0].args[0]);
-    EXPECT_EQ(programParameter(program.program, GL_LINK_STATUS), GL_TRUE);
+    EXPECT_TRUE(glIsProgram(program.program));
+}
+
+// A fresh process for each child: a forked copy of a process with a live GL
+// driver is not safe to use. Nothing reaches standard output.
+TEST(ShaderProgramDeath, FragmentSyntaxErrorExits88AfterTheVertexShaderCompiled) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    // The vertex shader is compiled and kept; only the failing shader is deleted.
+    EXPECT_EXIT(buildProgramAndWatchTheExit("precision mediump float;\nvoid main() { gl_FragColor = vec4(1.0) }\n"),
+                testing::ExitedWithCode(88),
+                testing::MatchesRegex(report("0:2\\([0-9]+\\): error: .+", "compileShader", 88,
+                                             "glCreateShader\\(vertex\\) glShaderSource glCompileShader glGetShaderiv "
+                                             "glCreateShader\\(fragment\\) glShaderSource glCompileShader "
+                                             "glGetShaderiv glGetShaderInfoLog glDeleteShader\\(fragment\\)")));
+}
+
+TEST(ShaderProgramDeath, ShadersThatCompileButDoNotLinkExit67) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    // The fragment input does not match the vertex output.
+    EXPECT_EXIT(buildProgramAndWatchTheExit("precision mediump float;\nvarying vec3 vValue;\n"
+                                            "void main() { gl_FragColor = vec4(vValue, 1.0); }\n"),
+                testing::ExitedWithCode(67),
+                testing::MatchesRegex(report(".*vValue.+", "init", 67,
+                                             ".* glLinkProgram glDetachShader glDetachShader "
+                                             "glDeleteShader\\(vertex\\) glDeleteShader\\(fragment\\) "
+                                             "glGetProgramiv glGetProgramInfoLog glDeleteProgram")));
 }

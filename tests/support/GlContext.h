@@ -31,13 +31,6 @@ public:
     // Leaves no context current on this thread.
     static void releaseCurrent();
 
-    EGLContext context() const { return mContext; }
-    EGLContext secondContext() const { return mSecond; }
-    EGLDisplay display() const { return mDisplay; }
-    EGLSurface surface() const { return mSurface; }
-    int width() const { return mWidth; }
-    int height() const { return mHeight; }
-
     static EGLDisplay sharedDisplay();
 
 private:

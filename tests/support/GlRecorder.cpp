@@ -2,11 +2,12 @@
 
 #include <EGL/egl.h>
 #include <GLES2/gl2.h>
-#include <GLES2/gl2ext.h>
 
 #include <algorithm>
 #include <atomic>
 #include <cstdint>
+#include <mutex>
+#include <type_traits>
 
 namespace vitest {
 
@@ -37,24 +38,17 @@ std::vector<GlCall> GlRecorder::calls() {
 }
 
 std::vector<GlCall> GlRecorder::callsNamed(const std::string& name) {
-    std::lock_guard<std::mutex> lock(gLogMutex);
     std::vector<GlCall> result;
-    for (const GlCall& call : gLog)
+    for (const GlCall& call : calls())
         if (call.name == name) result.push_back(call);
-    return result;
-}
-
-std::vector<std::string> GlRecorder::names() {
-    std::lock_guard<std::mutex> lock(gLogMutex);
-    std::vector<std::string> result;
-    for (const GlCall& call : gLog) result.push_back(call.name);
     return result;
 }
 
 std::vector<std::string> GlRecorder::names(const std::vector<std::string>& filter) {
     std::vector<std::string> result;
-    for (const std::string& name : names())
-        if (std::find(filter.begin(), filter.end(), name) != filter.end()) result.push_back(name);
+    for (const GlCall& call : calls())
+        if (filter.empty() || std::find(filter.begin(), filter.end(), call.name) != filter.end())
+            result.push_back(call.name);
     return result;
 }
 
@@ -75,146 +69,139 @@ void GlRecorder::record(const char* name, std::initializer_list<double> args, co
 using vitest::GlRecorder;
 
 namespace {
-double ptr(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
+
+template <class T>
+double number(T value) {
+    if constexpr (std::is_pointer_v<T>) return double(reinterpret_cast<std::uintptr_t>(value));
+    else return double(value);
+}
+
+// Records a call with its arguments as numbers.
+struct Record {
+    const char* name;
+    template <class... T>
+    void operator()(T... values) const { GlRecorder::record(name, {number(values)...}); }
+};
+
 }  // namespace
 
-// Each wrapper records its call (calls with a result get the result as their
-// last argument; glGen* get the first generated name) and forwards to the driver.
-#define FORWARD0(ret, name, params, args, ...)                  \
-    extern "C" ret __real_##name params;                        \
-    extern "C" ret __wrap_##name params {                       \
-        GlRecorder::record(#name, {__VA_ARGS__});               \
-        return __real_##name args;                              \
+// Each wrapper records its call, then forwards it to the driver.
+#define WRAP(name, params, args)      \
+    extern "C" void __real_##name params; \
+    extern "C" void __wrap_##name params { \
+        Record{#name} args;               \
+        __real_##name args;               \
     }
 
-FORWARD0(void, glActiveTexture, (GLenum t), (t), double(t))
-FORWARD0(void, glAttachShader, (GLuint p, GLuint s), (p, s), double(p), double(s))
-FORWARD0(void, glBindBuffer, (GLenum t, GLuint b), (t, b), double(t), double(b))
-FORWARD0(void, glBindFramebuffer, (GLenum t, GLuint b), (t, b), double(t), double(b))
-FORWARD0(void, glBindRenderbuffer, (GLenum t, GLuint b), (t, b), double(t), double(b))
-FORWARD0(void, glBindTexture, (GLenum t, GLuint b), (t, b), double(t), double(b))
-FORWARD0(void, glBlendFunc, (GLenum s, GLenum d), (s, d), double(s), double(d))
-FORWARD0(void, glBufferData, (GLenum t, GLsizeiptr n, const void* d, GLenum u), (t, n, d, u), double(t), double(n),
-         ptr(d), double(u))
-FORWARD0(void, glClear, (GLbitfield m), (m), double(m))
-FORWARD0(void, glClearColor, (GLfloat r, GLfloat g, GLfloat b, GLfloat a), (r, g, b, a), r, g, b, a)
-FORWARD0(void, glColorMask, (GLboolean r, GLboolean g, GLboolean b, GLboolean a), (r, g, b, a), double(r), double(g),
-         double(b), double(a))
-FORWARD0(void, glCompileShader, (GLuint s), (s), double(s))
-FORWARD0(void, glCompressedTexImage2D,
-         (GLenum t, GLint l, GLenum f, GLsizei w, GLsizei h, GLint b, GLsizei n, const void* d),
-         (t, l, f, w, h, b, n, d), double(t), double(l), double(f), double(w), double(h), double(b), double(n), ptr(d))
-FORWARD0(void, glCullFace, (GLenum m), (m), double(m))
-FORWARD0(void, glDeleteProgram, (GLuint p), (p), double(p))
-FORWARD0(void, glDeleteShader, (GLuint s), (s), double(s))
-FORWARD0(void, glDepthFunc, (GLenum f), (f), double(f))
-FORWARD0(void, glDepthMask, (GLboolean f), (f), double(f))
-FORWARD0(void, glDetachShader, (GLuint p, GLuint s), (p, s), double(p), double(s))
-FORWARD0(void, glDisable, (GLenum c), (c), double(c))
-FORWARD0(void, glDrawArrays, (GLenum m, GLint f, GLsizei c), (m, f, c), double(m), double(f), double(c))
-FORWARD0(void, glDrawElements, (GLenum m, GLsizei c, GLenum t, const void* i), (m, c, t, i), double(m), double(c),
-         double(t), ptr(i))
-FORWARD0(void, glEnable, (GLenum c), (c), double(c))
-FORWARD0(void, glEnableVertexAttribArray, (GLuint i), (i), double(i))
-FORWARD0(void, glFramebufferRenderbuffer, (GLenum t, GLenum a, GLenum rt, GLuint r), (t, a, rt, r), double(t),
-         double(a), double(rt), double(r))
-FORWARD0(void, glFramebufferTexture2D, (GLenum t, GLenum a, GLenum tt, GLuint tex, GLint l), (t, a, tt, tex, l),
-         double(t), double(a), double(tt), double(tex), double(l))
-FORWARD0(void, glGetProgramInfoLog, (GLuint p, GLsizei n, GLsizei* l, GLchar* s), (p, n, l, s), double(p), double(n))
-FORWARD0(void, glGetProgramiv, (GLuint p, GLenum e, GLint* v), (p, e, v), double(p), double(e))
-FORWARD0(void, glGetShaderInfoLog, (GLuint p, GLsizei n, GLsizei* l, GLchar* s), (p, n, l, s), double(p), double(n))
-FORWARD0(void, glGetShaderiv, (GLuint p, GLenum e, GLint* v), (p, e, v), double(p), double(e))
-FORWARD0(void, glLinkProgram, (GLuint p), (p), double(p))
-FORWARD0(void, glPixelStorei, (GLenum e, GLint v), (e, v), double(e), double(v))
-FORWARD0(void, glReadPixels, (GLint x, GLint y, GLsizei w, GLsizei h, GLenum f, GLenum t, void* p),
-         (x, y, w, h, f, t, p), double(x), double(y), double(w), double(h), double(f), double(t), ptr(p))
-FORWARD0(void, glRenderbufferStorage, (GLenum t, GLenum f, GLsizei w, GLsizei h), (t, f, w, h), double(t), double(f),
-         double(w), double(h))
-FORWARD0(void, glTexImage2D,
-         (GLenum t, GLint l, GLint i, GLsizei w, GLsizei h, GLint b, GLenum f, GLenum ty, const void* p),
-         (t, l, i, w, h, b, f, ty, p), double(t), double(l), double(i), double(w), double(h), double(b), double(f),
-         double(ty), ptr(p))
-FORWARD0(void, glTexParameteri, (GLenum t, GLenum p, GLint v), (t, p, v), double(t), double(p), double(v))
-FORWARD0(void, glTexSubImage2D,
-         (GLenum t, GLint l, GLint x, GLint y, GLsizei w, GLsizei h, GLenum f, GLenum ty, const void* p),
-         (t, l, x, y, w, h, f, ty, p), double(t), double(l), double(x), double(y), double(w), double(h), double(f),
-         double(ty), ptr(p))
-FORWARD0(void, glUniform1i, (GLint l, GLint v), (l, v), double(l), double(v))
-FORWARD0(void, glUseProgram, (GLuint p), (p), double(p))
-FORWARD0(void, glVertexAttribPointer, (GLuint i, GLint s, GLenum t, GLboolean n, GLsizei st, const void* p),
-         (i, s, t, n, st, p), double(i), double(s), double(t), double(n), double(st), ptr(p))
-FORWARD0(void, glViewport, (GLint x, GLint y, GLsizei w, GLsizei h), (x, y, w, h), double(x), double(y), double(w),
-         double(h))
+WRAP(glActiveTexture, (GLenum a), (a))
+WRAP(glAttachShader, (GLuint a, GLuint b), (a, b))
+WRAP(glBindBuffer, (GLenum a, GLuint b), (a, b))
+WRAP(glBindFramebuffer, (GLenum a, GLuint b), (a, b))
+WRAP(glBindRenderbuffer, (GLenum a, GLuint b), (a, b))
+WRAP(glBindTexture, (GLenum a, GLuint b), (a, b))
+WRAP(glBlendFunc, (GLenum a, GLenum b), (a, b))
+WRAP(glBufferData, (GLenum a, GLsizeiptr b, const void* c, GLenum d), (a, b, c, d))
+WRAP(glClear, (GLbitfield a), (a))
+WRAP(glClearColor, (GLfloat a, GLfloat b, GLfloat c, GLfloat d), (a, b, c, d))
+WRAP(glColorMask, (GLboolean a, GLboolean b, GLboolean c, GLboolean d), (a, b, c, d))
+WRAP(glCompileShader, (GLuint a), (a))
+WRAP(glCompressedTexImage2D, (GLenum a, GLint b, GLenum c, GLsizei d, GLsizei e, GLint f, GLsizei g, const void* h),
+     (a, b, c, d, e, f, g, h))
+WRAP(glCullFace, (GLenum a), (a))
+WRAP(glDeleteProgram, (GLuint a), (a))
+WRAP(glDeleteShader, (GLuint a), (a))
+WRAP(glDepthFunc, (GLenum a), (a))
+WRAP(glDepthMask, (GLboolean a), (a))
+WRAP(glDetachShader, (GLuint a, GLuint b), (a, b))
+WRAP(glDisable, (GLenum a), (a))
+WRAP(glDrawArrays, (GLenum a, GLint b, GLsizei c), (a, b, c))
+WRAP(glDrawElements, (GLenum a, GLsizei b, GLenum c, const void* d), (a, b, c, d))
+WRAP(glEnable, (GLenum a), (a))
+WRAP(glEnableVertexAttribArray, (GLuint a), (a))
+WRAP(glFramebufferRenderbuffer, (GLenum a, GLenum b, GLenum c, GLuint d), (a, b, c, d))
+WRAP(glFramebufferTexture2D, (GLenum a, GLenum b, GLenum c, GLuint d, GLint e), (a, b, c, d, e))
+WRAP(glGetProgramInfoLog, (GLuint a, GLsizei b, GLsizei* c, GLchar* d), (a, b, c, d))
+WRAP(glGetProgramiv, (GLuint a, GLenum b, GLint* c), (a, b, c))
+WRAP(glGetShaderInfoLog, (GLuint a, GLsizei b, GLsizei* c, GLchar* d), (a, b, c, d))
+WRAP(glGetShaderiv, (GLuint a, GLenum b, GLint* c), (a, b, c))
+WRAP(glLinkProgram, (GLuint a), (a))
+WRAP(glPixelStorei, (GLenum a, GLint b), (a, b))
+WRAP(glReadPixels, (GLint a, GLint b, GLsizei c, GLsizei d, GLenum e, GLenum f, void* g), (a, b, c, d, e, f, g))
+WRAP(glRenderbufferStorage, (GLenum a, GLenum b, GLsizei c, GLsizei d), (a, b, c, d))
+WRAP(glTexImage2D, (GLenum a, GLint b, GLint c, GLsizei d, GLsizei e, GLint f, GLenum g, GLenum h, const void* i),
+     (a, b, c, d, e, f, g, h, i))
+WRAP(glTexParameteri, (GLenum a, GLenum b, GLint c), (a, b, c))
+WRAP(glTexSubImage2D, (GLenum a, GLint b, GLint c, GLint d, GLsizei e, GLsizei f, GLenum g, GLenum h, const void* i),
+     (a, b, c, d, e, f, g, h, i))
+WRAP(glUniform1i, (GLint a, GLint b), (a, b))
+WRAP(glUseProgram, (GLuint a), (a))
+WRAP(glVertexAttribPointer, (GLuint a, GLint b, GLenum c, GLboolean d, GLsizei e, const void* f), (a, b, c, d, e, f))
+WRAP(glViewport, (GLint a, GLint b, GLsizei c, GLsizei d), (a, b, c, d))
 
-// Uniform arrays: location, count, then the first element's components.
-#define FORWARD_UNIFORM(name, type, n)                                              \
-    extern "C" void __real_##name(GLint l, GLsizei c, const type* v);               \
-    extern "C" void __wrap_##name(GLint l, GLsizei c, const type* v) {              \
-        if (GlRecorder::isRecording()) {                                            \
-            double e[4] = {0, 0, 0, 0};                                             \
-            for (int i = 0; i < n && v; ++i) e[i] = double(v[i]);                   \
-            GlRecorder::record(#name, {double(l), double(c), e[0], e[1], e[2], e[3]}); \
-        }                                                                           \
-        __real_##name(l, c, v);                                                     \
+// Uniforms: location, count, then the first element's components (up to
+// four); matrices: location, count, transpose, then the first four elements.
+#define WRAP_UNIFORM(name, type, n)                                                                      \
+    extern "C" void __real_##name(GLint l, GLsizei c, const type* v);                                    \
+    extern "C" void __wrap_##name(GLint l, GLsizei c, const type* v) {                                   \
+        Record{#name}(l, c, v[0], n > 1 ? v[1] : 0, n > 2 ? v[2] : 0, n > 3 ? v[3] : 0);                 \
+        __real_##name(l, c, v);                                                                          \
     }
-FORWARD_UNIFORM(glUniform1iv, GLint, 1)
-FORWARD_UNIFORM(glUniform2iv, GLint, 2)
-FORWARD_UNIFORM(glUniform3iv, GLint, 3)
-FORWARD_UNIFORM(glUniform4iv, GLint, 4)
-FORWARD_UNIFORM(glUniform1fv, GLfloat, 1)
-FORWARD_UNIFORM(glUniform2fv, GLfloat, 2)
-FORWARD_UNIFORM(glUniform3fv, GLfloat, 3)
-FORWARD_UNIFORM(glUniform4fv, GLfloat, 4)
-
-// Matrices: location, count, transpose, then the first four elements.
-#define FORWARD_MATRIX(name)                                                                  \
-    extern "C" void __real_##name(GLint l, GLsizei c, GLboolean t, const GLfloat* v);          \
-    extern "C" void __wrap_##name(GLint l, GLsizei c, GLboolean t, const GLfloat* v) {         \
-        GlRecorder::record(#name, {double(l), double(c), double(t), v ? v[0] : 0.0, v ? v[1] : 0.0, \
-                                   v ? v[2] : 0.0, v ? v[3] : 0.0});                           \
-        __real_##name(l, c, t, v);                                                             \
+WRAP_UNIFORM(glUniform1iv, GLint, 1)
+WRAP_UNIFORM(glUniform2iv, GLint, 2)
+WRAP_UNIFORM(glUniform3iv, GLint, 3)
+WRAP_UNIFORM(glUniform4iv, GLint, 4)
+WRAP_UNIFORM(glUniform1fv, GLfloat, 1)
+WRAP_UNIFORM(glUniform2fv, GLfloat, 2)
+WRAP_UNIFORM(glUniform3fv, GLfloat, 3)
+WRAP_UNIFORM(glUniform4fv, GLfloat, 4)
+#define WRAP_MATRIX(name)                                                                 \
+    extern "C" void __real_##name(GLint l, GLsizei c, GLboolean t, const GLfloat* v);     \
+    extern "C" void __wrap_##name(GLint l, GLsizei c, GLboolean t, const GLfloat* v) {    \
+        Record{#name}(l, c, t, v[0], v[1], v[2], v[3]);                                   \
+        __real_##name(l, c, t, v);                                                        \
     }
-FORWARD_MATRIX(glUniformMatrix2fv)
-FORWARD_MATRIX(glUniformMatrix3fv)
-FORWARD_MATRIX(glUniformMatrix4fv)
+WRAP_MATRIX(glUniformMatrix2fv)
+WRAP_MATRIX(glUniformMatrix3fv)
+WRAP_MATRIX(glUniformMatrix4fv)
 
-// Name generation: count and the first generated name.
-#define FORWARD_GEN(name)                                      \
-    extern "C" void __real_##name(GLsizei n, GLuint* names);   \
-    extern "C" void __wrap_##name(GLsizei n, GLuint* names) {  \
+// Names made and deleted: the count and the first name (made ones after the call).
+#define WRAP_NAMES(name, type, before, after)                  \
+    extern "C" void __real_##name(GLsizei n, type* names);     \
+    extern "C" void __wrap_##name(GLsizei n, type* names) {    \
+        if (before) Record{#name}(n, names[0]);                \
         __real_##name(n, names);                               \
-        GlRecorder::record(#name, {double(n), double(names[0])}); \
+        if (after) Record{#name}(n, names[0]);                 \
     }
-FORWARD_GEN(glGenBuffers)
-FORWARD_GEN(glGenFramebuffers)
-FORWARD_GEN(glGenRenderbuffers)
-FORWARD_GEN(glGenTextures)
+WRAP_NAMES(glGenBuffers, GLuint, false, true)
+WRAP_NAMES(glGenFramebuffers, GLuint, false, true)
+WRAP_NAMES(glGenRenderbuffers, GLuint, false, true)
+WRAP_NAMES(glGenTextures, GLuint, false, true)
+WRAP_NAMES(glDeleteBuffers, const GLuint, true, false)
+WRAP_NAMES(glDeleteFramebuffers, const GLuint, true, false)
+WRAP_NAMES(glDeleteRenderbuffers, const GLuint, true, false)
+WRAP_NAMES(glDeleteTextures, const GLuint, true, false)
 
-FORWARD0(void, glDeleteBuffers, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
-FORWARD0(void, glDeleteFramebuffers, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
-FORWARD0(void, glDeleteRenderbuffers, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
-FORWARD0(void, glDeleteTextures, (GLsizei n, const GLuint* b), (n, b), double(n), double(b[0]))
-
-// Calls with a result: the result is recorded after the arguments.
-#define FORWARD_RESULT(ret, name, params, args, text, ...)  \
-    extern "C" ret __real_##name params;                    \
-    extern "C" ret __wrap_##name params {                   \
-        ret result = __real_##name args;                    \
-        GlRecorder::record(#name, {__VA_ARGS__}, text);     \
-        return result;                                      \
+// Calls with a result: the result is recorded after the arguments; a name
+// looked up is kept as the call's text.
+#define WRAP_RESULT(ret, name, params, args, text, ...)  \
+    extern "C" ret __real_##name params;                 \
+    extern "C" ret __wrap_##name params {                \
+        ret result = __real_##name args;                 \
+        GlRecorder::record(#name, {__VA_ARGS__}, text);  \
+        return result;                                   \
     }
-FORWARD_RESULT(GLenum, glCheckFramebufferStatus, (GLenum t), (t), nullptr, double(t), double(result))
-FORWARD_RESULT(GLuint, glCreateProgram, (), (), nullptr, double(result))
-FORWARD_RESULT(GLuint, glCreateShader, (GLenum t), (t), nullptr, double(t), double(result))
-FORWARD_RESULT(GLint, glGetAttribLocation, (GLuint p, const GLchar* n), (p, n), n, double(p), double(result))
-FORWARD_RESULT(GLint, glGetUniformLocation, (GLuint p, const GLchar* n), (p, n), n, double(p), double(result))
-FORWARD_RESULT(GLboolean, glIsProgram, (GLuint p), (p), nullptr, double(p), double(result))
-FORWARD_RESULT(GLboolean, glIsTexture, (GLuint t), (t), nullptr, double(t), double(result))
-FORWARD_RESULT(EGLContext, eglGetCurrentContext, (), (), nullptr, ptr(result))
+WRAP_RESULT(GLenum, glCheckFramebufferStatus, (GLenum t), (t), nullptr, double(t), double(result))
+WRAP_RESULT(GLuint, glCreateProgram, (), (), nullptr, double(result))
+WRAP_RESULT(GLuint, glCreateShader, (GLenum t), (t), nullptr, double(t), double(result))
+WRAP_RESULT(GLint, glGetAttribLocation, (GLuint p, const GLchar* n), (p, n), n, double(p), double(result))
+WRAP_RESULT(GLint, glGetUniformLocation, (GLuint p, const GLchar* n), (p, n), n, double(p), double(result))
+WRAP_RESULT(GLboolean, glIsProgram, (GLuint p), (p), nullptr, double(p), double(result))
+WRAP_RESULT(GLboolean, glIsTexture, (GLuint t), (t), nullptr, double(t), double(result))
+WRAP_RESULT(EGLContext, eglGetCurrentContext, (), (), nullptr, number(result))
 
 extern "C" const GLubyte* __real_glGetString(GLenum e);
 extern "C" const GLubyte* __wrap_glGetString(GLenum e) {
-    GlRecorder::record("glGetString", {double(e)});
+    Record{"glGetString"}(e);
     const char* override = GlRecorder::rendererOverride();
     if (e == GL_RENDERER && override) return reinterpret_cast<const GLubyte*>(override);
     return __real_glGetString(e);
@@ -222,6 +209,6 @@ extern "C" const GLubyte* __wrap_glGetString(GLenum e) {
 
 extern "C" void __real_glShaderSource(GLuint s, GLsizei c, const GLchar* const* t, const GLint* l);
 extern "C" void __wrap_glShaderSource(GLuint s, GLsizei c, const GLchar* const* t, const GLint* l) {
-    GlRecorder::record("glShaderSource", {double(s), double(c), ptr(l)}, c > 0 ? t[0] : nullptr);
+    GlRecorder::record("glShaderSource", {double(s), double(c), number(l)}, c > 0 ? t[0] : nullptr);
     __real_glShaderSource(s, c, t, l);
 }

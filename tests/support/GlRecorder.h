@@ -1,22 +1,21 @@
 #pragma once
 
 // Records the GL (and eglGetCurrentContext) calls the runtime makes, on their
-// way to the real driver: test binaries linked with vi_link_recorded() have
-// every runtime call of these functions routed through -Wl,--wrap wrappers
-// that append the call to a log and then call the real function. Only calls
-// made from the runtime's static objects (and the test's own code) pass here;
-// the driver answers every call.
+// way to the real driver: binaries linked with vi_link_recorded() route every
+// call of the wrapped functions through -Wl,--wrap wrappers that append the
+// call to a log and then call the real function. Only calls made from the
+// static runtime (and the test's own code) pass here.
 
-#include <mutex>
+#include <initializer_list>
 #include <string>
 #include <vector>
 
 namespace vitest {
 
 struct GlCall {
-    std::string name;           // "glTexImage2D"
-    std::vector<double> args;   // numeric arguments in order; pointers as addresses
-    std::string text;           // glShaderSource: the source; glGet*Location: the name
+    std::string name;          // "glTexImage2D"
+    std::vector<double> args;  // numeric arguments in order; pointers as addresses
+    std::string text;          // glShaderSource: the source; glGet*Location: the name
 };
 
 class GlRecorder {
@@ -29,18 +28,17 @@ public:
 
     static std::vector<GlCall> calls();
     static std::vector<GlCall> callsNamed(const std::string& name);
-    static std::vector<std::string> names();  // names of all recorded calls in order
-    // Names in order, keeping only those in `filter`.
-    static std::vector<std::string> names(const std::vector<std::string>& filter);
+    // Names of the recorded calls in order; with a filter, only those in it.
+    static std::vector<std::string> names(const std::vector<std::string>& filter = {});
     static int count(const std::string& name);
 
-    // Makes glGetString(GL_RENDERER) answer `renderer` (null: the driver's own
-    // answer). For a test binary of its own: the runtime reads it once per process.
+    // Makes glGetString(GL_RENDERER) answer `renderer`. For a test binary of
+    // its own: the runtime reads it once per process.
     static void setRendererOverride(const char* renderer);
+    static const char* rendererOverride();
 
     // Used by the wrappers.
     static void record(const char* name, std::initializer_list<double> args, const char* text = nullptr);
-    static const char* rendererOverride();
 };
 
 // Records for the lifetime of the object.

@@ -1,11 +1,16 @@
 #pragma once
 
-// Renderers the render-target tests draw with: a full-viewport quad painted
-// in one colour (read from the painter's own variable at every draw, so a
-// test changes it between frames), or painted from a sampled texture.
+// Quads over the whole viewport drawn by the runtime's own renderer: painted
+// in one colour (read from the painter's variable at every draw, so a test
+// changes it between frames), from a 2D texture (one texel per pixel when the
+// viewport has the texture's size), or from a cube texture in one direction.
+
+#include <cstdint>
+#include <vector>
 
 #include <glm/glm.hpp>
 
+#include "Pictures.h"
 #include "Render/Drawable.h"
 #include "Render/GL.h"
 #include "Render/Renderer.h"
@@ -53,6 +58,14 @@ public:
 
     vi::Renderer* renderer() { return &mRenderer; }
 
+    // Draws into the window's width x height corner and returns those pixels, bottom row first.
+    std::vector<std::uint32_t> draw(int width, int height) {
+        glBindFramebuffer(GL_FRAMEBUFFER, 0);
+        glViewport(0, 0, width, height);
+        mRenderer.render();
+        return readWords(0, 0, width, height);
+    }
+
 protected:
     vi::ShaderProgram mProgram;
     Quad mQuad;
@@ -72,6 +85,7 @@ public:
     glm::vec4 colour;
 };
 
+// Binds `source` through the renderer, as an effect would (which allocates it).
 class TexturePainter : public QuadPainter {
 public:
     explicit TexturePainter(vi::Texture* source)
@@ -81,6 +95,26 @@ public:
                       "void main() { gl_FragColor = texture2D(uSource, vUv); }\n") {
         mRenderer.addTexture("uSource", source);
     }
+};
+
+// The colour a cube texture shows in `direction`.
+class CubePainter : public QuadPainter {
+public:
+    explicit CubePainter(vi::Texture* cube)
+        : QuadPainter("precision mediump float;\n"
+                      "uniform samplerCube uSource;\n"
+                      "uniform vec3 uDirection;\n"
+                      "void main() { gl_FragColor = textureCube(uSource, uDirection); }\n") {
+        mRenderer.addTexture("uSource", cube);
+        mRenderer.addUniform("uDirection", &direction[0], vi::Uniform::Float3, 1);
+    }
+
+    std::uint32_t look(float x, float y, float z) {
+        direction = glm::vec3(x, y, z);
+        return draw(1, 1)[0];
+    }
+
+    glm::vec3 direction;
 };
 
 }  // namespace vitest

@@ -1,8 +1,8 @@
 // A steady frame allocates nothing: repeated draws of a renderer with
 // attributes, uniforms, plain, dynamic and curve textures and a dynamic
 // render target make no heap allocation after the first frame. The counter
-// sees every operator new, and the mallocs made from this executable, which
-// holds the runtime (the GL driver's own bookkeeping is not the runtime's).
+// (the bench's) sees every operator new, and the mallocs made from this
+// executable, which holds the runtime (not the GL driver's bookkeeping).
 #include <gtest/gtest.h>
 
 #include <cstdint>

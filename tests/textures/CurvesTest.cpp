@@ -9,9 +9,9 @@
 #include <vector>
 
 #include "GlContext.h"
+#include "Painters.h"
 #include "Render/Curves.h"
 #include "Render/Texture.h"
-#include "Pictures.h"
 
 using glm::vec2;
 
@@ -19,49 +19,42 @@ namespace {
 
 int texel(const vi::Curves& curves, int x, int channel) { return curves.mTable[4 * x + channel]; }
 
-TEST(CurvesTable, StraightDiagonalGivesTheWorkedValues) {
+TEST(CurvesTable, SegmentsGiveTheWorkedValuesMeetTheirEndsAndShareJoints) {
     const vec2 diagonal[] = {{0, 0}, {255, 255}};
-    vi::Curves curves(diagonal, 2, nullptr, 0, nullptr, 0);
-    const int xs[] = {0, 1, 64, 128, 192, 254, 255};
-    const int expected[] = {0, 0, 52, 128, 203, 254, 255};
-    for (int i = 0; i < 7; ++i) EXPECT_EQ(texel(curves, xs[i], vi::Curves::RED), expected[i]) << "texel " << xs[i];
-    // Monotonic from end to end: every texel was written.
-    for (int x = 1; x < 256; ++x) EXPECT_GE(texel(curves, x, 0), texel(curves, x - 1, 0));
+    const vec2 bend[] = {{0, 0}, {128, 200}, {255, 40}};
+    const vec2 steps[] = {{10, 30}, {11, 90}, {20, 90}, {21, 250}};  // two-texel segments, one at the end
+    vi::Curves curves(diagonal, 2, bend, 3, steps, 4);
+    struct Row {
+        int channel, x, value;
+    };
+    // Midway through the bend's first segment, t = 64/128 gives 200 * 0.5 exactly.
+    for (const Row& row : {Row{0, 0, 0}, Row{0, 1, 0}, Row{0, 64, 52}, Row{0, 128, 128}, Row{0, 192, 203},
+                           Row{0, 254, 254}, Row{0, 255, 255}, Row{1, 64, 100}, Row{1, 128, 200}, Row{1, 255, 40},
+                           Row{2, 9, 0}, Row{2, 10, 30}, Row{2, 11, 90}, Row{2, 20, 90}, Row{2, 21, 250},
+                           Row{2, 22, 0}})
+        EXPECT_EQ(texel(curves, row.x, row.channel), row.value) << "channel " << row.channel << " texel " << row.x;
+    for (int x = 1; x < 256; ++x) EXPECT_GE(texel(curves, x, 0), texel(curves, x - 1, 0)) << x;
 }
 
-TEST(CurvesTable, EachSegmentUsesOnlyItsOwnEndsAndJointsAreShared) {
-    const vec2 points[] = {{0, 0}, {128, 200}, {255, 40}};
-    vi::Curves curves(nullptr, 0, nullptr, 0, points, 3);
-    EXPECT_EQ(texel(curves, 0, vi::Curves::BLUE), 0);
-    EXPECT_EQ(texel(curves, 128, vi::Curves::BLUE), 200);
-    EXPECT_EQ(texel(curves, 255, vi::Curves::BLUE), 40);
-    // Midway through the first segment: t = 64/128 gives 200 * 0.5 exactly.
-    EXPECT_EQ(texel(curves, 64, vi::Curves::BLUE), 100);
-}
-
-TEST(CurvesTable, ShortListsAndOtherBytesAreLeftAlone) {
+TEST(CurvesTable, ShortListsAndOtherBytesAreLeftAloneAndAnEarlierTextureIsKept) {
     const vec2 ramp[] = {{0, 255}, {255, 255}};
     // The table is zeroed before the first computation, whatever the storage held.
     alignas(vi::Curves) unsigned char storage[sizeof(vi::Curves)];
     std::memset(storage, 0xAB, sizeof(storage));
     vi::Curves* curves = new (storage) vi::Curves(ramp, 2, nullptr, 0, ramp, 1);
-    for (int x = 0; x < 256; ++x) {
-        ASSERT_EQ(texel(*curves, x, vi::Curves::RED), 255);
-        ASSERT_EQ(texel(*curves, x, vi::Curves::GREEN), 0);
-        ASSERT_EQ(texel(*curves, x, vi::Curves::BLUE), 0);
-        ASSERT_EQ(texel(*curves, x, 3), 0);
-    }
+    for (int x = 0; x < 256; ++x)
+        ASSERT_EQ(std::vector<int>({texel(*curves, x, 0), texel(*curves, x, 1), texel(*curves, x, 2),
+                                    texel(*curves, x, 3)}),
+                  (std::vector<int>{255, 0, 0, 0})) << x;
 
-    // A later computation with one point for red and none for green keeps
-    // both channels; a texture made earlier is not deleted by it.
     vi::Texture* first = curves->getTexture();
     const vec2 single[] = {{128, 0}};
     const vec2 blue[] = {{0, 9}, {3, 9}};
     curves->calculateCatmullRomPoints(single, 1, nullptr, 0, blue, 2);
     EXPECT_NE(curves->getTexture(), first);
-    for (int x = 0; x < 256; ++x) ASSERT_EQ(texel(*curves, x, vi::Curves::RED), 255) << x;
-    EXPECT_EQ(texel(*curves, 3, vi::Curves::BLUE), 9);
-    EXPECT_EQ(texel(*curves, 4, vi::Curves::BLUE), 0);
+    EXPECT_EQ(texel(*curves, 200, 0), 255);
+    EXPECT_EQ(texel(*curves, 3, 2), 9);
+    EXPECT_EQ(texel(*curves, 4, 2), 0);
     delete first;
     curves->~Curves();
 }
@@ -95,8 +88,7 @@ TEST(CurvesTable, RandomSegmentsGiveTheSameBytesOnEveryCpu) {
         const int end = start + 8 + 4 * int(next(std::uint32_t(255 - start / 4 - 1)));
         vec2 p[4];  // drawn one by one: the order of a call's arguments is not fixed
         for (vec2& point : p) point = vec2(0.0f, float(int(next(2496)) - 200) / 8.0f);
-        const vi::Curves::CHANNELS channel = vi::Curves::CHANNELS(next(3));
-        curves.calculateCatmullRomPoint(start, end, p[0], p[1], p[2], p[3], channel);
+        curves.calculateCatmullRomPoint(start, end, p[0], p[1], p[2], p[3], vi::Curves::CHANNELS(next(3)));
         ++segments;
         for (unsigned char byte : curves.mTable) digest = (digest ^ byte) * 1099511628211ull;
     }
@@ -110,19 +102,13 @@ TEST(CurvesTexture, IsADynamicOneByTwoHundredFiftySixTextureThatSamplesToTheTabl
     const vec2 green[] = {{0, 255}, {100, 30}, {255, 180}};
     const vec2 blue[] = {{20, 60}, {200, 250}};
     vi::Curves curves(red, 2, green, 3, blue, 2);
-    const vi::Texture& texture = *curves.getTexture();
-    EXPECT_EQ(texture.mBuffer, static_cast<void*>(curves.mTable));
-    EXPECT_EQ(glm::uvec2(texture.mWidth, texture.mHeight), glm::uvec2(1, 256));
-    EXPECT_FALSE(texture.mIsStatic || texture.mIsDeletable);
-    curves.getTexture()->allocate();
-    vitest::SamplerProbe probe(vitest::SamplerProbe::Flat);
-
-    std::vector<std::uint32_t> sampled = probe.draw(*curves.getTexture(), 1, 256);
+    EXPECT_EQ(curves.getTexture()->mBuffer, static_cast<void*>(curves.mTable));
+    EXPECT_FALSE(curves.getTexture()->mIsDeletable);
+    vitest::TexturePainter painter(curves.getTexture());
+    std::vector<std::uint32_t> sampled = painter.draw(1, 256);
     for (int x = 0; x < 256; ++x) ASSERT_EQ(sampled[std::size_t(x)], vitest::rgba(&curves.mTable[4 * x])) << x;
-
     curves.mTable[4 * 77 + 3] = 0x5A;
-    sampled = probe.draw(*curves.getTexture(), 1, 256);
-    EXPECT_EQ(sampled[77] & 0xFF, 0x5Au);
+    EXPECT_EQ(painter.draw(1, 256)[77] & 0xFF, 0x5Au);
 }
 
 }  // namespace
