@@ -10,77 +10,72 @@ namespace vitest {
 
 namespace {
 
-[[noreturn]] void fail(const char* what) {
+// A failure of the test bed itself ends the process at once.
+template <class T>
+T check(T value, bool ok, const char* what) {
+    if (ok) return value;
     std::fprintf(stderr, "test bed: %s failed (EGL error 0x%x)\n", what, eglGetError());
     std::abort();
 }
 
-}  // namespace
-
-EGLDisplay GlContext::sharedDisplay() {
-    static EGLDisplay display = [] {
-        auto getPlatformDisplay =
-            reinterpret_cast<PFNEGLGETPLATFORMDISPLAYEXTPROC>(eglGetProcAddress("eglGetPlatformDisplayEXT"));
-        if (!getPlatformDisplay) fail("eglGetPlatformDisplayEXT lookup");
-        EGLDisplay d = getPlatformDisplay(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr);
-        if (d == EGL_NO_DISPLAY) fail("eglGetPlatformDisplayEXT");
-        if (!eglInitialize(d, nullptr, nullptr)) fail("eglInitialize");
-        if (!eglBindAPI(EGL_OPENGL_ES_API)) fail("eglBindAPI");
-        return d;
+EGLDisplay display() {
+    static EGLDisplay shared = [] {
+        auto get = reinterpret_cast<PFNEGLGETPLATFORMDISPLAYEXTPROC>(eglGetProcAddress("eglGetPlatformDisplayEXT"));
+        EGLDisplay d = get ? get(EGL_PLATFORM_SURFACELESS_MESA, EGL_DEFAULT_DISPLAY, nullptr) : EGL_NO_DISPLAY;
+        return check(d, d != EGL_NO_DISPLAY && eglInitialize(d, nullptr, nullptr) && eglBindAPI(EGL_OPENGL_ES_API),
+                     "the EGL display");
     }();
-    return display;
+    return shared;
 }
 
-GlContext::GlContext(int width, int height)
-    : mDisplay(sharedDisplay()), mConfig(nullptr), mSurface(EGL_NO_SURFACE), mContext(EGL_NO_CONTEXT),
-      mSecond(EGL_NO_CONTEXT), mWidth(width), mHeight(height) {
+EGLContext createContext(EGLConfig config) {
+    const EGLint attributes[] = {EGL_CONTEXT_CLIENT_VERSION, 2, EGL_NONE};
+    EGLContext context = eglCreateContext(display(), config, EGL_NO_CONTEXT, attributes);
+    return check(context, context != EGL_NO_CONTEXT, "eglCreateContext");
+}
+
+}  // namespace
+
+GlContext::GlContext(int width, int height) : mWidth(width), mHeight(height) {
     const EGLint configAttributes[] = {EGL_SURFACE_TYPE, EGL_PBUFFER_BIT, EGL_RENDERABLE_TYPE, EGL_OPENGL_ES2_BIT,
                                        EGL_RED_SIZE, 8, EGL_GREEN_SIZE, 8, EGL_BLUE_SIZE, 8, EGL_ALPHA_SIZE, 8,
                                        EGL_DEPTH_SIZE, 16, EGL_NONE};
     EGLint count = 0;
-    if (!eglChooseConfig(mDisplay, configAttributes, &mConfig, 1, &count) || count < 1) fail("eglChooseConfig");
+    check(0, eglChooseConfig(display(), configAttributes, &mConfig, 1, &count) && count == 1, "eglChooseConfig");
     const EGLint surfaceAttributes[] = {EGL_WIDTH, width, EGL_HEIGHT, height, EGL_NONE};
-    mSurface = eglCreatePbufferSurface(mDisplay, mConfig, surfaceAttributes);
-    if (mSurface == EGL_NO_SURFACE) fail("eglCreatePbufferSurface");
-    mContext = createContext();
+    mSurface = eglCreatePbufferSurface(display(), mConfig, surfaceAttributes);
+    check(0, mSurface != EGL_NO_SURFACE, "eglCreatePbufferSurface");
+    mContext = createContext(mConfig);
     makeCurrent();
 }
 
 GlContext::~GlContext() {
-    eglMakeCurrent(mDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
-    if (mSecond != EGL_NO_CONTEXT) eglDestroyContext(mDisplay, mSecond);
-    eglDestroyContext(mDisplay, mContext);
-    eglDestroySurface(mDisplay, mSurface);
+    releaseCurrent();
+    if (mSecond != EGL_NO_CONTEXT) eglDestroyContext(display(), mSecond);
+    eglDestroyContext(display(), mContext);
+    eglDestroySurface(display(), mSurface);
 }
 
-EGLContext GlContext::createContext() {
-    const EGLint contextAttributes[] = {EGL_CONTEXT_CLIENT_VERSION, 2, EGL_NONE};
-    EGLContext context = eglCreateContext(mDisplay, mConfig, EGL_NO_CONTEXT, contextAttributes);
-    if (context == EGL_NO_CONTEXT) fail("eglCreateContext");
-    return context;
-}
-
-void GlContext::makeCurrent() {
-    if (!eglMakeCurrent(mDisplay, mSurface, mSurface, mContext)) fail("eglMakeCurrent");
+void GlContext::use(EGLContext context) {
+    check(0, eglMakeCurrent(display(), mSurface, mSurface, context), "eglMakeCurrent");
     glViewport(0, 0, mWidth, mHeight);
 }
+
+void GlContext::makeCurrent() { use(mContext); }
 
 void GlContext::makeSecondCurrent() {
-    if (mSecond == EGL_NO_CONTEXT) mSecond = createContext();
-    if (!eglMakeCurrent(mDisplay, mSurface, mSurface, mSecond)) fail("eglMakeCurrent (second)");
-    glViewport(0, 0, mWidth, mHeight);
+    if (mSecond == EGL_NO_CONTEXT) mSecond = createContext(mConfig);
+    use(mSecond);
 }
 
 void GlContext::recreate() {
-    eglMakeCurrent(mDisplay, EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
-    eglDestroyContext(mDisplay, mContext);
-    mContext = createContext();
+    releaseCurrent();
+    eglDestroyContext(display(), mContext);
+    mContext = createContext(mConfig);
     makeCurrent();
 }
 
-void GlContext::releaseCurrent() {
-    eglMakeCurrent(sharedDisplay(), EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT);
-}
+void GlContext::releaseCurrent() { eglMakeCurrent(display(), EGL_NO_SURFACE, EGL_NO_SURFACE, EGL_NO_CONTEXT); }
 
 std::vector<std::uint8_t> readPixels(int x, int y, int width, int height) {
     std::vector<std::uint8_t> pixels(std::size_t(width) * height * 4);
@@ -90,8 +85,8 @@ std::vector<std::uint8_t> readPixels(int x, int y, int width, int height) {
 }
 
 std::uint32_t readPixel(int x, int y) {
-    std::vector<std::uint8_t> p = readPixels(x, y, 1, 1);
-    return (std::uint32_t(p[0]) << 24) | (std::uint32_t(p[1]) << 16) | (std::uint32_t(p[2]) << 8) | p[3];
+    const std::vector<std::uint8_t> p = readPixels(x, y, 1, 1);
+    return std::uint32_t(p[0]) << 24 | std::uint32_t(p[1]) << 16 | std::uint32_t(p[2]) << 8 | p[3];
 }
 
 }  // namespace vitest

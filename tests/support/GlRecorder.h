@@ -2,11 +2,9 @@
 
 // Records the GL (and eglGetCurrentContext) calls the runtime makes, on their
 // way to the real driver: binaries linked with vi_link_recorded() route every
-// call of the wrapped functions through -Wl,--wrap wrappers that append the
-// call to a log and then call the real function. Only calls made from the
-// static runtime (and the test's own code) pass here.
+// call of the functions wrapped in GlRecorder.cpp through -Wl,--wrap wrappers
+// that call the driver and then append the call to a log.
 
-#include <initializer_list>
 #include <string>
 #include <vector>
 
@@ -14,7 +12,8 @@ namespace vitest {
 
 struct GlCall {
     std::string name;          // "glTexImage2D"
-    std::vector<double> args;  // numeric arguments in order; pointers as addresses
+    std::vector<double> args;  // numbers in order, then the result; a name array or a
+                               // value array as its first element, other pointers as addresses
     std::string text;          // glShaderSource: the source; glGet*Location: the name
 };
 
@@ -23,8 +22,6 @@ public:
     // Clears the log and starts recording; stop() ends it. Recording is off at start.
     static void start();
     static void stop();
-    static void clear();
-    static bool isRecording();
 
     static std::vector<GlCall> calls();
     static std::vector<GlCall> callsNamed(const std::string& name);
@@ -35,15 +32,12 @@ public:
     // Makes glGetString(GL_RENDERER) answer `renderer`. For a test binary of
     // its own: the runtime reads it once per process.
     static void setRendererOverride(const char* renderer);
-    static const char* rendererOverride();
 
-    // Used by the wrappers.
-    static void record(const char* name, std::initializer_list<double> args, const char* text = nullptr);
+    static void record(const char* name, std::vector<double> args, const char* text = nullptr);
 };
 
 // Records for the lifetime of the object.
-class GlRecording {
-public:
+struct GlRecording {
     GlRecording() { GlRecorder::start(); }
     ~GlRecording() { GlRecorder::stop(); }
 };

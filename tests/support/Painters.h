@@ -2,8 +2,8 @@
 
 // Quads over the whole viewport drawn by the runtime's own renderer: painted
 // in one colour (read from the painter's variable at every draw, so a test
-// changes it between frames), from a 2D texture (one texel per pixel when the
-// viewport has the texture's size), or from a cube texture in one direction.
+// changes it between frames), or from a texture (one texel per pixel when the
+// viewport has the texture's size).
 
 #include <cstdint>
 #include <vector>
@@ -95,26 +95,6 @@ public:
                       "void main() { gl_FragColor = texture2D(uSource, vUv); }\n") {
         mRenderer.addTexture("uSource", source);
     }
-};
-
-// The colour a cube texture shows in `direction`.
-class CubePainter : public QuadPainter {
-public:
-    explicit CubePainter(vi::Texture* cube)
-        : QuadPainter("precision mediump float;\n"
-                      "uniform samplerCube uSource;\n"
-                      "uniform vec3 uDirection;\n"
-                      "void main() { gl_FragColor = textureCube(uSource, uDirection); }\n") {
-        mRenderer.addTexture("uSource", cube);
-        mRenderer.addUniform("uDirection", &direction[0], vi::Uniform::Float3, 1);
-    }
-
-    std::uint32_t look(float x, float y, float z) {
-        direction = glm::vec3(x, y, z);
-        return draw(1, 1)[0];
-    }
-
-    glm::vec3 direction;
 };
 
 }  // namespace vitest

@@ -1,7 +1,6 @@
 #pragma once
 
-// Pictures on the real context as the tests read them back: pixels as
-// 0xRRGGBBAA words, and uniform values as the program holds them.
+// Pixels as the tests read them back: 0xRRGGBBAA words.
 
 #include <GLES2/gl2.h>
 
@@ -31,14 +30,6 @@ inline bool near(std::uint32_t a, std::uint32_t b, int tolerance) {
     for (int shift = 0; shift < 32; shift += 8)
         if (std::abs(int(a >> shift & 0xFF) - int(b >> shift & 0xFF)) > tolerance) return false;
     return true;
-}
-
-// The first n floats of a uniform as the program holds it.
-inline std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
-    std::vector<float> values(16, -99.0f);
-    glGetUniformfv(program, glGetUniformLocation(program, name), values.data());
-    values.resize(std::size_t(n));
-    return values;
 }
 
 }  // namespace vitest

@@ -5,7 +5,6 @@
 
 #include <stdlib.h>
 
-#include <cstdint>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -21,19 +20,21 @@ public:
         mPath = mkdtemp(pattern);
     }
     ~ScratchDirectory() { std::filesystem::remove_all(mPath); }
-
     ScratchDirectory(const ScratchDirectory&) = delete;
     ScratchDirectory& operator=(const ScratchDirectory&) = delete;
 
     const std::string& path() const { return mPath; }
     std::string pathOf(const std::string& name) const { return mPath + "/" + name; }
+    bool exists(const std::string& name) const { return std::filesystem::exists(pathOf(name)); }
 
-    void write(const std::string& name, const std::string& text) const { writeRaw(name, text.data(), text.size()); }
-    void write(const std::string& name, const std::vector<char>& bytes) const {
-        writeRaw(name, bytes.data(), bytes.size());
+    // Writes text or bytes, making the folders on the way.
+    void write(const std::string& name, const std::string& bytes) const {
+        std::filesystem::create_directories(std::filesystem::path(pathOf(name)).parent_path());
+        std::ofstream(pathOf(name), std::ios::binary) << bytes;
     }
-    void write(const std::string& name, const std::vector<std::uint8_t>& bytes) const {
-        writeRaw(name, bytes.data(), bytes.size());
+    template <class Byte>
+    void write(const std::string& name, const std::vector<Byte>& bytes) const {
+        write(name, std::string(bytes.begin(), bytes.end()));
     }
 
     template <class Byte = char>
@@ -41,8 +42,6 @@ public:
         std::ifstream in(pathOf(name), std::ios::binary);
         return std::vector<Byte>(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
     }
-
-    bool exists(const std::string& name) const { return std::filesystem::exists(pathOf(name)); }
 
     // Every entry of the directory, so a test can see that nothing was left behind.
     std::vector<std::string> entries() const {
@@ -53,12 +52,6 @@ public:
     }
 
 private:
-    void writeRaw(const std::string& name, const void* data, std::size_t size) const {
-        std::filesystem::create_directories(std::filesystem::path(pathOf(name)).parent_path());
-        std::ofstream out(pathOf(name), std::ios::binary);
-        out.write(static_cast<const char*>(data), std::streamsize(size));
-    }
-
     std::string mPath;
 };
 

@@ -1,0 +1,254 @@
+// Files, models, the background and the lit renderer: reading and saving
+// whole files, the fatal end of an unreadable one, and the pictures, shared
+// programs and shader texts of the background and the lit renderer.
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <unistd.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "GlRecorder.h"
+#include "Painters.h"
+#include "Render/Background.h"
+#include "Render/LightRenderer.h"
+#include "Render/ModelObject.h"
+#include "Render/RenderableTexture.h"
+#include "Scratch.h"
+#include "Tools/DirectoryAssetManager.h"
+#include "Tools/FatalReport.h"
+#include "Tools/File.h"
+
+using vitest::GlRecorder;
+using vitest::readPixel;
+using Bytes = std::vector<char>;
+using Floats = std::vector<float>;
+
+namespace {
+
+constexpr std::uint32_t kTexel = 0xC86432FF, kBlue = 0x0000FFFF;
+
+// A scratch directory as the asset and the external-storage directory.
+struct AssetDirectory : vitest::ScratchDirectory {
+    AssetDirectory() : manager(vi::DirectoryAssetManager::create(path())) {
+        vi::File::getAssetManager() = manager;
+        vi::File::setExternalStorageDirectory(path() + "/");
+    }
+    ~AssetDirectory() {
+        vi::File::getAssetManager() = nullptr;
+        vi::DirectoryAssetManager::destroy(manager);
+    }
+    AAssetManager* manager;
+};
+
+// A model file: the vertex and index counts, then positions, normals,
+// texture coordinates and 16-bit indices.
+std::string modelFile(const Floats& positions, const Floats& normals, const Floats& texCoords,
+                      const std::vector<std::uint16_t>& indices) {
+    const std::uint32_t counts[2] = {std::uint32_t(positions.size() / 3), std::uint32_t(indices.size())};
+    std::string bytes(reinterpret_cast<const char*>(counts), 8);
+    for (const Floats* array : {&positions, &normals, &texCoords})
+        bytes.append(reinterpret_cast<const char*>(array->data()), array->size() * 4);
+    return bytes.append(reinterpret_cast<const char*>(indices.data()), indices.size() * 2);
+}
+
+// A death test's child: the report is printed at exit, and stdout lands on
+// stderr after it, so an exact match of stderr also proves stdout stayed silent.
+void openAndWatchTheExit(const std::string& name, bool isAsset) {
+    std::atexit([] { std::fputs(vi::FatalReport::msLastReport->c_str(), stderr); });
+    dup2(STDERR_FILENO, STDOUT_FILENO);
+    vi::File file(name, isAsset);
+}
+
+std::string invalidFileReport(const std::string& name, const char* function, int line) {
+    return "\"Invalid file name: \"" + name + "\"\"\nIn file : \"" VI_RUNTIME_SOURCE_DIR "/Tools/File.cpp\"\n" +
+           "In function : \"" + function + "\"\nIn line : " + std::to_string(line);
+}
+
+Bytes contentsOf(vi::File& file) { return Bytes(file.getBuffer(), file.getBuffer() + file.getLength()); }
+
+class Framework : public testing::Test {
+protected:
+    std::uint32_t draw(vi::Renderer& renderer, int x = 32, int y = 32) {
+        glClearColor(0.0f, 0.0f, 1.0f, 1.0f);
+        glClear(GL_COLOR_BUFFER_BIT);
+        renderer.render();
+        return readPixel(x, y);
+    }
+
+    // Light and eye straight above the centre, far enough for the
+    // interpolated directions to be straight up there.
+    void bindLighting(vi::Renderer& renderer) {
+        renderer.addUniform("uAmbient", &ambient, vi::Uniform::Float, 1);
+        renderer.addUniform("uDiffuse", &diffuse, vi::Uniform::Float, 1);
+        renderer.addUniform("uSpecular", &specular, vi::Uniform::Float, 1);
+        renderer.addUniform("uShininess", &shininess, vi::Uniform::Float, 1);
+        renderer.addUniform("uLightPosition", &light[0], vi::Uniform::Float3, 1);
+        renderer.addUniform("uEyePosition", &eye[0], vi::Uniform::Float3, 1);
+    }
+
+    vitest::GlContext gl{64, 64};
+    std::uint8_t texels[16] = {200, 100, 50, 255, 0, 255, 0, 255, 0, 0, 255, 255, 255, 255, 255, 255};
+    vi::Texture plain{texels, 1, 1, true, false, false, false, false, 4, false};
+    float ambient = 0, diffuse = 0, specular = 0, shininess = 1;
+    glm::vec3 light{0, 0, 100}, eye{0, 0, 100};
+};
+
+}  // namespace
+
+TEST(FileDeathTest, MissingAssetExits71AndMissingFileExits45WithOnlyTheReport) {
+    AssetDirectory assets;
+    EXPECT_EXIT(openAndWatchTheExit("missing.bin", true), testing::ExitedWithCode(71),
+                testing::StrEq(invalidFileReport("missing.bin", "load", 71)));
+    EXPECT_EXIT(openAndWatchTheExit(assets.pathOf("x.raw"), false), testing::ExitedWithCode(45),
+                testing::StrEq(invalidFileReport(assets.pathOf("x.raw"), "File", 45)));
+}
+
+TEST(File, LoadTakesTheWholeFileAndWritesCollectUntilAFlushThatAlwaysEmptiesTheBuffer) {
+    AssetDirectory assets;
+    assets.write("data/bytes.bin", Bytes{'\0', 'a', char(0xFF), '\n', 'z'});
+    assets.write("empty.bin", "");
+    vi::File file;
+    file.write("12345678", 8);
+    file.load("data/bytes.bin");
+    EXPECT_EQ(contentsOf(file), assets.read("data/bytes.bin"));
+    vi::File byPath(assets.pathOf("data/bytes.bin"), false);
+    EXPECT_EQ(contentsOf(byPath), assets.read("data/bytes.bin"));
+    file.load("empty.bin");
+    EXPECT_EQ(file.getLength(), 0u);
+
+    file.write("abc", 3);
+    file.write("12345", 5);
+    file.flush("a.raw", false);
+    EXPECT_EQ(assets.read("a.raw"), (Bytes{'a', 'b', 'c', '1', '2', '3', '4', '5'}));
+    file.write("Z", 1);
+    file.flush("a.raw", true);  // truncates
+    EXPECT_EQ(assets.read("a.raw"), Bytes{'Z'});
+    file.write("abc", 3);
+    file.flush("no/such/directory/a.raw", false);
+    EXPECT_FALSE(assets.exists("no"));
+    EXPECT_EQ(file.getLength(), 0u);
+}
+
+TEST_F(Framework, LitFaceShowsAmbientDiffuseSpecularAndOpacityAsTheFactorsSay) {
+    const Floats positions = {-1, -1, 0, 1, -1, 0, -1, 1, 0, 1, 1, 0}, normals = {0, 0, 1, 0, 0, 1, 0, 0, 1, 0, 0, 1};
+    vi::Drawable face;  // with the default flags: every array goes up at every draw
+    face.mode = GL_TRIANGLE_STRIP;
+    face.texture = &plain;
+    face.positions = positions.data();
+    face.normals = face.texCoords = normals.data();
+    face.vertexCount = face.elementCount = 4;
+    vi::LightRenderer renderer(face);
+    bindLighting(renderer);
+    for (vi::Attribute* attribute : renderer.attributes) EXPECT_FALSE(attribute->isStatic) << attribute->name;
+    // Specular light is added uncoloured: 0.4 adds 102 to every channel.
+    const float rows[][5] = {{0.5f, 0, 0, 100, 1}, {1, 0, 0, 100, 0.5f}, {0, 1, 0, 100, 1}, {0, 1, 0, -100, 1},
+                             {0.5f, 0, 0.4f, 100, 1}};
+    const std::uint32_t expected[] = {0x643219FF, 0xC8643280, kTexel, 0x000000FF, 0xCA987FFF};
+    for (int row = 0; row < 5; ++row) {
+        ambient = rows[row][0];
+        diffuse = rows[row][1];
+        specular = rows[row][2];
+        light.z = rows[row][3];
+        face.opacity = rows[row][4];
+        EXPECT_TRUE(vitest::near(draw(renderer), expected[row], 3)) << std::hex << draw(renderer) << " row " << row;
+    }
+}
+
+TEST_F(Framework, ModelsFillDrawablesInPlaceAndALitModelShowsWhereItsVerticesAreScaledOrNot) {
+    AssetDirectory assets;
+    assets.write("triangle.bin", modelFile({0, 0, 0, 1, 0, 0, 0, 1, 0}, Floats(9, 0.5f), Floats(6, 0), {}));
+    vi::ModelObject triangle("triangle");
+    vi::Drawable drawable;
+    drawable.indices = reinterpret_cast<const unsigned short*>(triangle.getBuffer());
+    drawable.opacity = 0.25f;
+    drawable.positionsStatic = true;
+    triangle.fillDrawable(drawable);
+    EXPECT_EQ(std::vector<unsigned>({drawable.mode, drawable.vertexCount, drawable.elementCount}),
+              (std::vector<unsigned>{GL_TRIANGLES, 3, 3}));
+    EXPECT_EQ(drawable.indices, nullptr);  // an unindexed file draws a plain list
+    EXPECT_EQ(reinterpret_cast<const char*>(drawable.texCoords), triangle.getBuffer() + 8 + 72);
+    EXPECT_EQ(drawable.opacity, 0.25f);
+    // Positions and normals go up at every draw, so that scale() shows; texture coordinates once.
+    EXPECT_EQ(std::vector<bool>({drawable.positionsStatic, drawable.normalsStatic, drawable.texCoordsStatic}),
+              (std::vector<bool>{false, false, true}));
+
+    // "half" opens half.bin: the right half of the viewport, two indexed triangles.
+    assets.write("half", "not this one");
+    assets.write("half.bin", modelFile({0, -1, 0, 1, -1, 0, 0, 1, 0, 1, 1, 0}, {0, 0, 1, 0, 0, 1, 0, 0, 1, 0, 0, 1},
+                                       Floats(8, 0), {0, 1, 2, 2, 1, 3}));
+    vi::ModelObject model("half");
+    drawable.texture = &plain;
+    drawable.opacity = 1.0f;
+    model.fillDrawable(drawable);
+    vi::LightRenderer renderer(drawable);
+    bindLighting(renderer);
+    ambient = 1.0f;
+    EXPECT_TRUE(vitest::near(draw(renderer, 48, 32), kTexel, 2));
+    EXPECT_EQ(std::vector<std::uint32_t>({readPixel(62, 62), readPixel(16, 32)}),
+              (std::vector<std::uint32_t>{readPixel(48, 32), kBlue}));
+    model.scale(0.5f);
+    EXPECT_TRUE(vitest::near(draw(renderer, 40, 40), kTexel, 2));
+    EXPECT_EQ(readPixel(62, 62), kBlue);
+}
+
+TEST_F(Framework, RenderersShareOneProgramEachWithTheRuntimesShaderTextsUntilTheLastUserIsGone) {
+    vitest::GlRecording recording;
+    vi::Drawable face;
+    face.texture = &plain;
+    auto lit = std::make_unique<vi::LightRenderer>(face), secondLit = std::make_unique<vi::LightRenderer>(face);
+    auto background = std::make_unique<vi::Background>(plain), second = std::make_unique<vi::Background>(plain);
+    EXPECT_EQ(GlRecorder::count("glCreateProgram"), 2);
+    // The texts keep their shared lines, and the lit one the two blanks after "specular =".
+    const std::vector<vitest::GlCall> sources = GlRecorder::callsNamed("glShaderSource");
+    ASSERT_EQ(sources.size(), 4u);
+    EXPECT_THAT(sources[1].text, testing::HasSubstr("\nuniform float uOpacity;uniform float uAmbient;\n"));
+    EXPECT_THAT(sources[1].text, testing::HasSubstr("\n    float specular =  uSpecular * pow("));
+    EXPECT_THAT(sources[3].text, testing::HasSubstr("\nuniform float uOpacity;varying vec2 vTextureCoord;\nvoid main()\n"));
+    std::vector<std::string> attributes;
+    for (vi::Attribute* a : lit->attributes) attributes.push_back(a->name);
+    EXPECT_EQ(attributes, (std::vector<std::string>{"aPosition", "aNormal", "aTextureCoord"}));
+    EXPECT_TRUE(lit->program == secondLit->program && background->renderer->program == second->renderer->program);
+    const GLuint litProgram = lit->program->program, backgroundProgram = second->renderer->program->program;
+    lit.reset();
+    background.reset();
+    EXPECT_TRUE(glIsProgram(litProgram) && glIsProgram(backgroundProgram));
+    // An outside request for the background's program counts as a user too.
+    vi::ShaderProgram* outside = vi::BackgroundRenderer::getShaderProgram();
+    secondLit.reset();
+    second.reset();
+    EXPECT_FALSE(glIsProgram(litProgram));
+    EXPECT_EQ(vi::LightRenderer::msShaderProgram, nullptr);
+    EXPECT_EQ(vi::BackgroundRenderer::msShaderProgram, outside);
+    vi::ShaderProgram::releaseShared(vi::BackgroundRenderer::msShaderProgram, vi::BackgroundRenderer::msUseCount);
+    EXPECT_FALSE(glIsProgram(backgroundProgram));
+}
+
+TEST_F(Framework, BackgroundShowsTheFirstRowAtTheTopStretchedWhateverTheOpacityAndATargetBehindItIsRedrawn) {
+    // First row red, green; second row blue, white.
+    std::uint8_t quadrants[16] = {255, 0, 0, 255, 0, 255, 0, 255, 0, 0, 255, 255, 255, 255, 255, 255};
+    vi::Texture texture(quadrants, 2, 2, true, false, false, false, false, 4, false);
+    vi::Background background(texture);
+    const vi::Drawable& d = background.drawable;  // what a plug-in reads: the tag, positions sent once
+    EXPECT_EQ(std::vector<unsigned>({d.userTag, d.positionsStatic, d.normalsStatic, d.texCoordsStatic}),
+              (std::vector<unsigned>{3, 1, 0, 0}));
+    vi::Renderer::setBlending(true);
+    background.drawable.opacity = 0.25f;
+    glViewport(0, 0, 64, 32);  // as wide as the surface and half as high: the picture follows
+    EXPECT_EQ(draw(*background.renderer, 1, 30), 0xFF0000FFu);
+    vi::Renderer::setBlending(false);
+    EXPECT_EQ(std::vector<std::uint32_t>({readPixel(32, 16), readPixel(31, 15), readPixel(62, 1), readPixel(8, 40)}),
+              (std::vector<std::uint32_t>{0x00FF00FF, 0x0000FFFF, 0xFFFFFFFF, kBlue}));
+
+    vitest::ColourPainter painter(glm::vec4(1, 0, 0, 1));
+    std::vector<vi::Renderer*> scene{painter.renderer()};
+    vi::RenderableTexture target(scene, 0, 0, 16, 16, false, false, false, false, false);
+    vi::RenderableTexture::mCurrentFrameBufferSize = glm::ivec2(64, 64);  // the window, which each pass restores
+    vi::Background behind(target);
+    EXPECT_EQ(draw(*behind.renderer), 0xFF0000FFu);
+    painter.colour = glm::vec4(0, 1, 0, 1);
+    EXPECT_EQ(draw(*behind.renderer, 62, 62), 0x00FF00FFu);
+}

@@ -1,0 +1,357 @@
+// Geometry (no GL), shader programs and renderers on a real context: the
+// build sequence and the two fatal exits the host tells apart, what renderers
+// bind by name and upload at each draw, and the matrices they derive.
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <unistd.h>
+
+#include <glm/gtc/matrix_transform.hpp>
+
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+#include <vector>
+
+#include "GlContext.h"
+#include "GlRecorder.h"
+#include "Render/Geometry.h"
+#include "Render/GeometryRectangle.h"
+#include "Render/Renderer.h"
+#include "Render/Texture.h"
+#include "Tools/FatalReport.h"
+
+using vitest::GlCall;
+using vitest::GlRecorder;
+using Args = std::vector<double>;
+using Names = std::vector<std::string>;
+using Points = std::vector<glm::vec3>;
+
+namespace {
+
+const char* const kVertex =
+    "attribute vec4 aPosition;\nattribute vec2 aOffset;\nvarying vec2 vValue;\n"
+    "void main() { vValue = aPosition.xy; gl_Position = aPosition + vec4(aOffset, 0.0, 0.0); }\n";
+const char* const kFragment =
+    "precision mediump float;\nvarying vec2 vValue;\nvoid main() { gl_FragColor = vec4(vValue, 0.0, 1.0); }\n";
+
+double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
+
+std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
+    std::vector<float> values(16, -99.0f);
+    glGetUniformfv(program, glGetUniformLocation(program, name), values.data());
+    return std::vector<float>(values.begin(), values.begin() + n);
+}
+
+// A death test's child: builds a program with `fragment` and, at its exit,
+// prints the fatal report, the calls made (shaders marked by kind) and how
+// many bytes reached standard output.
+std::FILE* gStdout = nullptr;
+void buildProgramAndWatchTheExit(const char* fragment) {
+    vitest::GlContext gl(8, 8);
+    std::fflush(stdout);
+    gStdout = std::tmpfile();
+    dup2(fileno(gStdout), STDOUT_FILENO);
+    std::atexit([] {
+        std::string line = vi::FatalReport::msLastReport ? *vi::FatalReport::msLastReport : "";
+        line += "\ncalls:";
+        double vertex = -1;
+        for (const GlCall& call : GlRecorder::calls()) {
+            line += ' ' + call.name;
+            if (call.name == "glCreateShader" && call.args[0] == GL_VERTEX_SHADER) vertex = call.args[1];
+            if (call.name == "glCreateShader" || call.name == "glDeleteShader")
+                line += call.args[call.name == "glCreateShader"] == vertex ? "(vertex)" : "(fragment)";
+        }
+        std::fflush(stdout);
+        std::fprintf(stderr, "%s\nstdout bytes: %ld\n", line.c_str(), std::ftell(gStdout));
+    });
+    GlRecorder::start();
+    vi::ShaderProgram program(kVertex, fragment);
+}
+
+// The driver's info log between quotes, the location block, then the calls.
+std::string report(const std::string& infoLog, const std::string& function, int line, const std::string& calls) {
+    return "^\"" + infoLog + "\"\nIn file : \"/[^\"]*/Render/ShaderProgram\\.cpp\"\nIn function : \"" + function +
+           "\"\nIn line : " + std::to_string(line) + "\ncalls: " + calls + "\nstdout bytes: 0\n$";
+}
+
+class RenderTest : public testing::Test {
+protected:
+    void TearDown() override {
+        GlRecorder::stop();
+        vi::Drawable::mProjectionMatrix = vi::Drawable::mViewMatrix = glm::mat4(1.0f);
+    }
+
+    vitest::GlContext mGl{16, 16};
+};
+
+}  // namespace
+
+TEST(Geometry, RotationMatchesGlmAboutAnyAxisAndLeavesNormals) {
+    const Points points = {{1, 0, 0}, {0, 2, 0}, {0.5f, -1, 3}, {-2, 4, -1.5f}};
+    for (const glm::vec3& axis : Points{{0, 0, 1}, {1, 0, 0}, {0, -3, 0}, {1, 2, 3}, {-0.2f, 5, 0.7f}}) {
+        vi::Geometry geometry;
+        geometry.positions = geometry.normals = points;
+        geometry.rotate(0.7f, axis);
+        const glm::mat4 rotation = glm::rotate(glm::mat4(1.0f), 0.7f, glm::normalize(axis));
+        for (std::size_t i = 0; i < points.size(); ++i)
+            for (int c = 0; c < 3; ++c)
+                EXPECT_NEAR(geometry.positions[i][c], (rotation * glm::vec4(points[i], 1.0f))[c], 1e-5f) << axis.y;
+        EXPECT_EQ(geometry.normals, points);
+    }
+    vi::Geometry plain;  // a plain geometry reconstructs to nothing
+    plain.positions = plain.normals = points;
+    plain.texCoords = {{1, 1}};
+    plain.indices = {0};
+    plain.reconstruct();
+    EXPECT_TRUE(plain.positions.empty() && plain.normals.empty() && plain.texCoords.empty() && plain.indices.empty());
+}
+
+TEST(GeometryRectangle, BuildsAStripQuadInPlaneZeroAndUpdateMovesOnlyItsCorners) {
+    vi::GeometryRectangle rectangle;
+    rectangle.positions.assign(6, glm::vec3(7));  // construction leaves exactly four of each
+    rectangle.construct({1, 2, 5}, {3, 4});
+    EXPECT_EQ(rectangle.mode, unsigned(GL_TRIANGLE_STRIP));
+    EXPECT_EQ(rectangle.positions, (Points{{1, 2, 0}, {1, 6, 0}, {4, 2, 0}, {4, 6, 0}}));
+    EXPECT_EQ(rectangle.texCoords, (std::vector<glm::vec2>{{0, 1}, {0, 0}, {1, 1}, {1, 0}}));
+    EXPECT_EQ(rectangle.indices, (std::vector<unsigned short>{0, 1, 2, 3}));
+    rectangle.normals[2] = {1, 0, 0};
+    rectangle.texCoords[0] = {0.5f, 0.5f};
+    rectangle.update({-1, -2, 9}, {2, 0.5f});
+    const Points moved = {{-1, -2, 0}, {-1, -1.5f, 0}, {1, -2, 0}, {1, -1.5f, 0}};
+    EXPECT_EQ(rectangle.positions, moved);
+    EXPECT_EQ(rectangle.normals, Points(4, glm::vec3(0, 0, 1)));
+    EXPECT_EQ(rectangle.texCoords[0], glm::vec2(0.5f, 0.5f));
+    EXPECT_EQ(rectangle.getBorder(), glm::vec4(-1, 1, -2, -1.5f));
+    rectangle.translate({3, 3, 3});
+    rectangle.reconstruct();
+    EXPECT_EQ(rectangle.positions, moved);
+}
+
+TEST_F(RenderTest, ProgramBuildsBothShadersKeepsNoneRebuildsOnlyAfterALossAndUnbindsBeforeDeletion) {
+    vitest::GlRecording recording;
+    auto* program = new vi::ShaderProgram(kVertex, kFragment);
+    program->init();
+    const double name = program->program;
+    ASSERT_EQ(GlRecorder::names(), (Names{"glCreateShader", "glShaderSource", "glCompileShader", "glGetShaderiv",
+                                          "glCreateShader", "glShaderSource", "glCompileShader", "glGetShaderiv",
+                                          "glCreateProgram", "glAttachShader", "glAttachShader", "glLinkProgram",
+                                          "glDetachShader", "glDetachShader", "glDeleteShader", "glDeleteShader",
+                                          "glGetProgramiv", "glIsProgram"}));
+    const std::vector<GlCall> c = GlRecorder::calls();
+    const double vertex = c[0].args[1], fragment = c[4].args[1];
+    EXPECT_EQ(c[0].args[0], GL_VERTEX_SHADER);
+    EXPECT_EQ(c[5].text, kFragment);
+    for (int i : {9, 12}) EXPECT_EQ(c[i].args, (Args{name, vertex}));
+    for (int i : {10, 13}) EXPECT_EQ(c[i].args, (Args{name, fragment}));
+    EXPECT_EQ(c[14].args[0], vertex);
+
+    mGl.recreate();
+    GlRecorder::start();
+    program->init();
+    ASSERT_EQ(GlRecorder::count("glCreateProgram"), 1);
+    EXPECT_EQ(program->program, GlRecorder::callsNamed("glCreateProgram")[0].args[0]);
+    glUseProgram(program->program);
+    GlRecorder::start();
+    delete program;
+    EXPECT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glDeleteProgram"}));
+    EXPECT_EQ(GlRecorder::calls()[0].args[0], 0);
+    EXPECT_FALSE(glIsProgram(GLuint(GlRecorder::calls()[1].args[0])));
+}
+
+// A fresh process for each child: a forked copy of a live GL driver is not safe.
+TEST(ShaderProgramDeath, FragmentSyntaxErrorExits88AfterTheVertexShaderCompiled) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    // The vertex shader is compiled and kept; only the failing shader is deleted.
+    EXPECT_EXIT(buildProgramAndWatchTheExit("precision mediump float;\nvoid main() { gl_FragColor = vec4(1.0) }\n"),
+                testing::ExitedWithCode(88),
+                testing::MatchesRegex(report("0:2\\([0-9]+\\): error: .+", "compileShader", 88,
+                                             "glCreateShader\\(vertex\\) glShaderSource glCompileShader glGetShaderiv "
+                                             "glCreateShader\\(fragment\\) glShaderSource glCompileShader "
+                                             "glGetShaderiv glGetShaderInfoLog glDeleteShader\\(fragment\\)")));
+}
+
+TEST(ShaderProgramDeath, ShadersThatCompileButDoNotLinkExit67) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(buildProgramAndWatchTheExit("precision mediump float;\nvarying vec3 vValue;\n"
+                                            "void main() { gl_FragColor = vec4(vValue, 1.0); }\n"),
+                testing::ExitedWithCode(67),
+                testing::MatchesRegex(report(".*vValue.+", "init", 67,
+                                             ".* glLinkProgram glDetachShader glDetachShader "
+                                             "glDeleteShader\\(vertex\\) glDeleteShader\\(fragment\\) "
+                                             "glGetProgramiv glGetProgramInfoLog glDeleteProgram")));
+}
+
+TEST_F(RenderTest, StandardUniformsAndSamplersAreBoundByNameAndReadAtEachDraw) {
+    vi::ShaderProgram program(
+        "attribute vec3 aPosition;\nuniform mat4 uModelMatrix;\nuniform mat4 uViewMatrix;\n"
+        "uniform mat3 uNormalMatrix;\nuniform mat4 uProjectionMatrix;\nuniform mat4 uModelViewProjectionMatrix;\n"
+        "varying vec3 vNormal;\nvoid main() {\n  vNormal = uNormalMatrix * aPosition;\n"
+        "  gl_Position = uModelViewProjectionMatrix * vec4(aPosition, 1.0)\n"
+        "    + uProjectionMatrix * uViewMatrix * uModelMatrix * vec4(vNormal, 0.0);\n}\n",
+        "precision mediump float;\nuniform float uOpacity;\nuniform sampler2D uFirst;\nuniform sampler2D uSecond;\n"
+        "uniform vec2 uFirstSize;\nuniform vec2 uFirstTexelSize;\nuniform vec2 uSecondTexelSize;\n"
+        "varying vec3 vNormal;\nvoid main() { gl_FragColor = vec4(vNormal, uOpacity)\n"
+        "  + texture2D(uFirst, uFirstSize * uFirstTexelSize) + texture2D(uSecond, uSecondTexelSize); }\n");
+    vi::Drawable drawable;
+    vitest::GlRecording recording;
+    vi::Renderer renderer(program, drawable);
+    Names looked;
+    for (const GlCall& call : GlRecorder::callsNamed("glGetUniformLocation")) looked.push_back(call.text);
+    EXPECT_EQ(looked, (Names{"uModelMatrix", "uViewMatrix", "uNormalMatrix", "uProjectionMatrix",
+                             "uModelViewProjectionMatrix", "uOpacity"}));
+    std::vector<std::uint8_t> pixels(64 * 4, 9);
+    vi::Texture first(pixels.data(), 4, 2, true, false, false, false, false, 4, false);
+    vi::Texture second(pixels.data(), 2, 8, false, false, false, false, false, 4, false);
+    // Names the program lacks and null textures leave no trace.
+    EXPECT_EQ(renderer.addUniform("uMissing", &drawable.opacity, vi::Uniform::Float, 1), -1);
+    EXPECT_EQ(renderer.addAttribute("aMissing", &drawable.opacity, 1, true), -1);
+    EXPECT_EQ(renderer.addTexture("uFirst", nullptr), -1);
+    EXPECT_EQ(renderer.addTexture("uMissing", &first), -1);
+    EXPECT_EQ(renderer.addTexture("uFirst", &first), 0);
+    EXPECT_EQ(renderer.addTexture("uSecond", &second), 1);
+    EXPECT_EQ(renderer.uniforms.size(), 6u + 3u);  // the program has no uSecondSize
+
+    vi::Drawable::mProjectionMatrix = glm::perspective(0.8f, 0.75f, 0.5f, 20.0f);
+    vi::Drawable::mViewMatrix = glm::lookAt(glm::vec3(1, 2, 5), glm::vec3(0), glm::vec3(0, 1, 0));
+    drawable.modelMatrix = glm::translate(glm::mat4(1.0f), glm::vec3(0.5f, 2, 3));
+    drawable.opacity = 0.25f;
+    GlRecorder::start();
+    renderer.render();
+    const GLuint p = program.program;
+    const float* view = &vi::Drawable::mViewMatrix[0][0];
+    EXPECT_EQ(uniformFloats(p, "uViewMatrix", 16), std::vector<float>(view, view + 16));
+    EXPECT_EQ(uniformFloats(p, "uNormalMatrix", 9)[8], drawable.normalMatrix[2][2]);
+    EXPECT_EQ(uniformFloats(p, "uModelMatrix", 16)[12], 0.5f);
+    EXPECT_EQ(uniformFloats(p, "uModelViewProjectionMatrix", 16)[14], drawable.modelViewProjectionMatrix[3][2]);
+    EXPECT_EQ(uniformFloats(p, "uOpacity", 1), std::vector<float>{0.25f});
+    EXPECT_EQ(uniformFloats(p, "uFirstTexelSize", 2), (std::vector<float>{0.25f, 0.5f}));
+    EXPECT_EQ(uniformFloats(p, "uSecondTexelSize", 2), (std::vector<float>{0.5f, 0.125f}));
+    // Uniforms, then the textures on units in order, then the draw.
+    EXPECT_EQ(GlRecorder::names({"glUniform2fv", "glUniform1i", "glDrawArrays"}),
+              (Names{"glUniform2fv", "glUniform2fv", "glUniform2fv", "glUniform1i", "glUniform1i", "glDrawArrays"}));
+    const std::vector<GlCall> units = GlRecorder::callsNamed("glUniform1i");
+    EXPECT_EQ(units[0].args, (Args{double(glGetUniformLocation(p, "uFirst")), 0}));
+    EXPECT_EQ(units[1].args, (Args{double(glGetUniformLocation(p, "uSecond")), 1}));
+}
+
+TEST_F(RenderTest, DynamicArraysAndChangedIndicesGoUpAtTheDrawStaticOnesOnceAndDestructionFreesThem) {
+    vi::ShaderProgram program(kVertex, kFragment);
+    const unsigned short indices[6] = {0, 1, 2, 2, 1, 3};
+    const float positions[8] = {-1, -1, -1, 1, 1, -1, 1, 1}, offsets[8] = {};
+    vi::Drawable drawable;
+    drawable.mode = GL_TRIANGLES;
+    drawable.vertexCount = 4;
+    drawable.elementCount = 6;
+    drawable.indices = indices;
+    vitest::GlRecording recording;
+    auto* renderer = new vi::Renderer(program, drawable);
+    EXPECT_EQ(renderer->addAttribute("aPosition", positions, 4, true), 0);
+    EXPECT_EQ(renderer->addAttribute("aOffset", offsets, 2, false), 1);
+    const std::vector<GlCall> made = GlRecorder::callsNamed("glBufferData");
+    EXPECT_EQ(made[0].args, (Args{GL_ELEMENT_ARRAY_BUFFER, 12, address(indices), GL_STATIC_DRAW}));
+    EXPECT_EQ(made[1].args, (Args{GL_ARRAY_BUFFER, 64, address(positions), GL_STATIC_DRAW}));
+    EXPECT_EQ(made[2].args, (Args{GL_ARRAY_BUFFER, 32, address(offsets), GL_STREAM_DRAW}));
+
+    // Counts are read at draw time; indices go up again only when marked changed.
+    GlRecorder::start();
+    renderer->render();
+    EXPECT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glBindBuffer", "glVertexAttribPointer", "glBindBuffer",
+                                          "glBufferData", "glVertexAttribPointer", "glBindBuffer", "glDrawElements"}));
+    EXPECT_EQ(GlRecorder::calls()[3].args[1], renderer->attributes[1]->buffer);
+    EXPECT_EQ(GlRecorder::calls()[7].args, (Args{GL_TRIANGLES, 6, GL_UNSIGNED_SHORT, 0}));
+    drawable.vertexCount = drawable.elementCount = 3;
+    drawable.indicesChanged = true;
+    GlRecorder::start();
+    renderer->render();
+    EXPECT_FALSE(drawable.indicesChanged);
+    const std::vector<GlCall> uploads = GlRecorder::callsNamed("glBufferData");
+    ASSERT_EQ(uploads.size(), 2u);
+    EXPECT_EQ(uploads[0].args[1], 24);
+    EXPECT_EQ(uploads[1].args, (Args{GL_ELEMENT_ARRAY_BUFFER, 6, address(indices), GL_STATIC_DRAW}));
+
+    const Args own = {double(renderer->indexBuffer), double(renderer->attributes[0]->buffer),
+                      double(renderer->attributes[1]->buffer)};
+    GlRecorder::start();
+    delete renderer;
+    Args deleted;
+    for (const GlCall& call : GlRecorder::callsNamed("glDeleteBuffers")) deleted.push_back(call.args[1]);
+    EXPECT_EQ(deleted, own);
+}
+
+TEST_F(RenderTest, EveryUniformTypeReachesTheProgramAndAnUnknownTypeUploadsNothing) {
+    vi::ShaderProgram program("attribute vec2 aPosition;\nuniform mat2 uM2;\nuniform mat3 uM3;\nuniform mat4 uM4;\n"
+                              "uniform int uI1;\nuniform ivec2 uI2;\nuniform ivec3 uI3;\nuniform ivec4 uI4;\n"
+                              "uniform float uF1;\nuniform vec2 uF2;\nuniform vec3 uF3;\nuniform vec4 uF4[2];\n"
+                              "uniform float uUnknown;\nvoid main() {\n"
+                              "  float s = (uM2 * vec2(1.0)).x + (uM3 * vec3(1.0)).y + (uM4 * vec4(1.0)).z\n"
+                              "    + float(uI1 + uI2.y + uI3.z + uI4.w) + uF1 + uF2.y + uF3.z + uF4[0].w + uF4[1].x\n"
+                              "    + uUnknown;\n  gl_Position = vec4(aPosition, s, 1.0);\n}\n",
+                              "precision mediump float;\nvoid main() { gl_FragColor = vec4(1.0); }\n");
+    vi::Drawable drawable;
+    vi::Renderer renderer(program, drawable);
+    const float f[16] = {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 16};
+    const int i[4] = {7, 8, 9, 10};
+    const Names names = {"uM2", "uM3", "uM4", "uI1", "uI2", "uI3", "uI4", "uF1", "uF2", "uF3", "uF4"};
+    for (int type = 0; type < 11; ++type)
+        renderer.addUniform(names[std::size_t(type)], type >= 3 && type <= 6 ? static_cast<const void*>(i) : f,
+                            vi::Uniform::UniformType(type), type == 10 ? 2 : 1);
+    EXPECT_EQ(renderer.addUniform("uUnknown", f, vi::Uniform::UniformType(11), 1), 11);
+    vitest::GlRecording recording;
+    renderer.render();
+    const Names uploads = {"glUniformMatrix2fv", "glUniformMatrix3fv", "glUniformMatrix4fv", "glUniform1iv",
+                           "glUniform2iv", "glUniform3iv", "glUniform4iv", "glUniform1fv", "glUniform2fv",
+                           "glUniform3fv", "glUniform4fv"};
+    EXPECT_EQ(GlRecorder::names(uploads), uploads);
+    EXPECT_EQ(uniformFloats(program.program, "uM3", 9), std::vector<float>(f, f + 9));
+    EXPECT_EQ(uniformFloats(program.program, "uF4[1]", 4), std::vector<float>(f + 4, f + 8));
+    EXPECT_EQ(uniformFloats(program.program, "uUnknown", 1), std::vector<float>{0.0f});
+    GLint ints[4] = {};
+    glGetUniformiv(program.program, glGetUniformLocation(program.program, "uI3"), ints);
+    EXPECT_EQ(std::vector<int>(ints, ints + 3), (std::vector<int>{7, 8, 9}));
+}
+
+TEST(Drawable, DerivedMatricesTakeTheCentredAffineShortcutAndMatchGlmWhereItHolds) {
+    auto expectNear = [](const glm::mat4& actual, const glm::mat4& expected, float tolerance) {
+        for (int e = 0; e < 16; ++e) EXPECT_NEAR(actual[e / 4][e % 4], expected[e / 4][e % 4], tolerance) << e;
+    };
+    vi::Drawable drawable;
+    const glm::mat4 view = glm::lookAt(glm::vec3(-2, 3, 6), glm::vec3(0, 1, 0), glm::vec3(0, 1, 0));
+    const glm::mat4 moved = glm::translate(glm::mat4(1.0f), glm::vec3(0.5f, -1.0f, -3.0f));
+    // Turned, unevenly scaled and moved: the normal matrix is not the rotation.
+    drawable.modelMatrix = glm::scale(glm::rotate(moved, 0.6f, glm::vec3(1, 2, 0.5f)), glm::vec3(2, 0.5f, 1.5f));
+    const glm::mat4 model = drawable.modelMatrix;
+    vi::Drawable::mViewMatrix = view;
+    vi::Drawable::mProjectionMatrix = glm::perspective(1.1f, 0.6f, 0.1f, 50.0f);
+    drawable.deriveMatrices();
+    expectNear(glm::mat4(drawable.normalMatrix), glm::mat4(glm::transpose(glm::inverse(glm::mat3(model)))), 1e-5f);
+    expectNear(drawable.modelViewMatrix, view * model, 1e-5f);
+    expectNear(drawable.modelViewProjectionMatrix, vi::Drawable::mProjectionMatrix * view * model, 1e-4f);
+
+    // An off-centre frustum: only elements 0, 5, 10, 11, 12, 13, 14 and 15
+    // count. The bottom rows of the view and the model are never read.
+    const glm::mat4 frustum = glm::frustum(-1.0f, 3.0f, -2.0f, 1.0f, 1.0f, 10.0f);
+    glm::mat4 centred(0.0f);
+    for (int e : {0, 5, 10, 11, 12, 13, 14, 15}) centred[e / 4][e % 4] = frustum[e / 4][e % 4];
+    vi::Drawable::mProjectionMatrix = frustum;
+    vi::Drawable::mViewMatrix[0][3] = 0.3f;
+    vi::Drawable::mViewMatrix[3][3] = 2.0f;
+    drawable.modelMatrix[1][3] = -0.4f;
+    drawable.deriveMatrices();
+    expectNear(drawable.modelViewProjectionMatrix, centred * view * model, 1e-4f);
+    vi::Drawable::mProjectionMatrix = vi::Drawable::mViewMatrix = glm::mat4(1.0f);
+}
+
+TEST_F(RenderTest, DepthTestWithoutLessOrGreaterIsEqualAndDisablingKeepsTheFunction) {
+    GLint function = -1;
+    vi::Renderer::setDepthTest(true, false, true);
+    glGetIntegerv(GL_DEPTH_FUNC, &function);
+    EXPECT_EQ(function, GL_EQUAL);
+    EXPECT_TRUE(glIsEnabled(GL_DEPTH_TEST));
+    vi::Renderer::setDepthTest(true, false, false);
+    vi::Renderer::setDepthTest(false, true, true);
+    glGetIntegerv(GL_DEPTH_FUNC, &function);
+    EXPECT_EQ(function, GL_GREATER);
+    EXPECT_FALSE(glIsEnabled(GL_DEPTH_TEST));
+}
