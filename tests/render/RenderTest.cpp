@@ -10,16 +10,12 @@
 
 #include <cstdint>
 #include <cstdio>
-#include <cstdlib>
 #include <string>
 #include <vector>
 
-#include "GlContext.h"
 #include "GlRecorder.h"
-#include "Render/Geometry.h"
+#include "Painters.h"
 #include "Render/GeometryRectangle.h"
-#include "Render/Renderer.h"
-#include "Render/Texture.h"
 #include "Tools/FatalReport.h"
 
 using vitest::GlCall;
@@ -47,15 +43,13 @@ std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
 // A death test's child: builds a program with `fragment` and, at its exit,
 // prints the fatal report, the calls made (shaders marked by kind) and how
 // many bytes reached standard output.
-std::FILE* gStdout = nullptr;
 void buildProgramAndWatchTheExit(const char* fragment) {
+    static std::FILE* output = std::tmpfile();
     vitest::GlContext gl(8, 8);
     std::fflush(stdout);
-    gStdout = std::tmpfile();
-    dup2(fileno(gStdout), STDOUT_FILENO);
+    dup2(fileno(output), STDOUT_FILENO);
     std::atexit([] {
-        std::string line = vi::FatalReport::msLastReport ? *vi::FatalReport::msLastReport : "";
-        line += "\ncalls:";
+        std::string line = *vi::FatalReport::msLastReport + "\ncalls:";
         double vertex = -1;
         for (const GlCall& call : GlRecorder::calls()) {
             line += ' ' + call.name;
@@ -64,7 +58,7 @@ void buildProgramAndWatchTheExit(const char* fragment) {
                 line += call.args[call.name == "glCreateShader"] == vertex ? "(vertex)" : "(fragment)";
         }
         std::fflush(stdout);
-        std::fprintf(stderr, "%s\nstdout bytes: %ld\n", line.c_str(), std::ftell(gStdout));
+        std::fprintf(stderr, "%s\nstdout bytes: %ld\n", line.c_str(), std::ftell(output));
     });
     GlRecorder::start();
     vi::ShaderProgram program(kVertex, fragment);
@@ -88,7 +82,7 @@ protected:
 
 }  // namespace
 
-TEST(Geometry, RotationMatchesGlmAboutAnyAxisAndLeavesNormals) {
+TEST(Geometry, RotationMatchesGlmAboutAnyAxisAndARectangleMovesOnlyItsCorners) {
     const Points points = {{1, 0, 0}, {0, 2, 0}, {0.5f, -1, 3}, {-2, 4, -1.5f}};
     for (const glm::vec3& axis : Points{{0, 0, 1}, {1, 0, 0}, {0, -3, 0}, {1, 2, 3}, {-0.2f, 5, 0.7f}}) {
         vi::Geometry geometry;
@@ -99,20 +93,12 @@ TEST(Geometry, RotationMatchesGlmAboutAnyAxisAndLeavesNormals) {
             for (int c = 0; c < 3; ++c)
                 EXPECT_NEAR(geometry.positions[i][c], (rotation * glm::vec4(points[i], 1.0f))[c], 1e-5f) << axis.y;
         EXPECT_EQ(geometry.normals, points);
+        geometry.reconstruct();  // a plain geometry reconstructs to nothing
+        EXPECT_TRUE(geometry.positions.empty() && geometry.normals.empty());
     }
-    vi::Geometry plain;  // a plain geometry reconstructs to nothing
-    plain.positions = plain.normals = points;
-    plain.texCoords = {{1, 1}};
-    plain.indices = {0};
-    plain.reconstruct();
-    EXPECT_TRUE(plain.positions.empty() && plain.normals.empty() && plain.texCoords.empty() && plain.indices.empty());
-}
-
-TEST(GeometryRectangle, BuildsAStripQuadInPlaneZeroAndUpdateMovesOnlyItsCorners) {
     vi::GeometryRectangle rectangle;
     rectangle.positions.assign(6, glm::vec3(7));  // construction leaves exactly four of each
     rectangle.construct({1, 2, 5}, {3, 4});
-    EXPECT_EQ(rectangle.mode, unsigned(GL_TRIANGLE_STRIP));
     EXPECT_EQ(rectangle.positions, (Points{{1, 2, 0}, {1, 6, 0}, {4, 2, 0}, {4, 6, 0}}));
     EXPECT_EQ(rectangle.texCoords, (std::vector<glm::vec2>{{0, 1}, {0, 0}, {1, 1}, {1, 0}}));
     EXPECT_EQ(rectangle.indices, (std::vector<unsigned short>{0, 1, 2, 3}));
@@ -129,35 +115,25 @@ TEST(GeometryRectangle, BuildsAStripQuadInPlaneZeroAndUpdateMovesOnlyItsCorners)
     EXPECT_EQ(rectangle.positions, moved);
 }
 
-TEST_F(RenderTest, ProgramBuildsBothShadersKeepsNoneRebuildsOnlyAfterALossAndUnbindsBeforeDeletion) {
+TEST_F(RenderTest, ProgramCompilesVertexFirstKeepsNoShaderAndUnbindsItselfBeforeDeletion) {
     vitest::GlRecording recording;
     auto* program = new vi::ShaderProgram(kVertex, kFragment);
-    program->init();
-    const double name = program->program;
+    program->init();  // the name is still valid: nothing is built
+    const std::vector<GlCall> c = GlRecorder::calls();
     ASSERT_EQ(GlRecorder::names(), (Names{"glCreateShader", "glShaderSource", "glCompileShader", "glGetShaderiv",
                                           "glCreateShader", "glShaderSource", "glCompileShader", "glGetShaderiv",
                                           "glCreateProgram", "glAttachShader", "glAttachShader", "glLinkProgram",
                                           "glDetachShader", "glDetachShader", "glDeleteShader", "glDeleteShader",
                                           "glGetProgramiv", "glIsProgram"}));
-    const std::vector<GlCall> c = GlRecorder::calls();
-    const double vertex = c[0].args[1], fragment = c[4].args[1];
-    EXPECT_EQ(c[0].args[0], GL_VERTEX_SHADER);
+    const double name = program->program, vertex = c[0].args[1], fragment = c[4].args[1];
+    EXPECT_EQ(Args({c[0].args[0], c[9].args[1], c[10].args[1], c[12].args[1], c[14].args[0], c[15].args[0]}),
+              (Args{GL_VERTEX_SHADER, vertex, fragment, vertex, vertex, fragment}));
     EXPECT_EQ(c[5].text, kFragment);
-    for (int i : {9, 12}) EXPECT_EQ(c[i].args, (Args{name, vertex}));
-    for (int i : {10, 13}) EXPECT_EQ(c[i].args, (Args{name, fragment}));
-    EXPECT_EQ(c[14].args[0], vertex);
-
-    mGl.recreate();
-    GlRecorder::start();
-    program->init();
-    ASSERT_EQ(GlRecorder::count("glCreateProgram"), 1);
-    EXPECT_EQ(program->program, GlRecorder::callsNamed("glCreateProgram")[0].args[0]);
     glUseProgram(program->program);
     GlRecorder::start();
     delete program;
     EXPECT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glDeleteProgram"}));
-    EXPECT_EQ(GlRecorder::calls()[0].args[0], 0);
-    EXPECT_FALSE(glIsProgram(GLuint(GlRecorder::calls()[1].args[0])));
+    EXPECT_EQ(Args({GlRecorder::calls()[0].args[0], GlRecorder::calls()[1].args[0]}), (Args{0, name}));
 }
 
 // A fresh process for each child: a forked copy of a live GL driver is not safe.
@@ -201,19 +177,17 @@ TEST_F(RenderTest, StandardUniformsAndSamplersAreBoundByNameAndReadAtEachDraw) {
     for (const GlCall& call : GlRecorder::callsNamed("glGetUniformLocation")) looked.push_back(call.text);
     EXPECT_EQ(looked, (Names{"uModelMatrix", "uViewMatrix", "uNormalMatrix", "uProjectionMatrix",
                              "uModelViewProjectionMatrix", "uOpacity"}));
-    std::vector<std::uint8_t> pixels(64 * 4, 9);
-    vi::Texture first(pixels.data(), 4, 2, true, false, false, false, false, 4, false);
-    vi::Texture second(pixels.data(), 2, 8, false, false, false, false, false, 4, false);
+    std::uint8_t pixels[64 * 4] = {};
+    vi::Texture first(pixels, 4, 2, true, false, false, false, false, 4, false);
+    vi::Texture second(pixels, 2, 8, false, false, false, false, false, 4, false);
     // Names the program lacks and null textures leave no trace.
-    EXPECT_EQ(renderer.addUniform("uMissing", &drawable.opacity, vi::Uniform::Float, 1), -1);
-    EXPECT_EQ(renderer.addAttribute("aMissing", &drawable.opacity, 1, true), -1);
-    EXPECT_EQ(renderer.addTexture("uFirst", nullptr), -1);
-    EXPECT_EQ(renderer.addTexture("uMissing", &first), -1);
-    EXPECT_EQ(renderer.addTexture("uFirst", &first), 0);
-    EXPECT_EQ(renderer.addTexture("uSecond", &second), 1);
+    EXPECT_EQ(std::vector<int>({renderer.addUniform("uMissing", pixels, vi::Uniform::Float, 1),
+                                renderer.addAttribute("aMissing", pixels, 1, true), renderer.addTexture("uFirst", nullptr),
+                                renderer.addTexture("uMissing", &first), renderer.addTexture("uFirst", &first),
+                                renderer.addTexture("uSecond", &second)}),
+              (std::vector<int>{-1, -1, -1, -1, 0, 1}));
     EXPECT_EQ(renderer.uniforms.size(), 6u + 3u);  // the program has no uSecondSize
 
-    vi::Drawable::mProjectionMatrix = glm::perspective(0.8f, 0.75f, 0.5f, 20.0f);
     vi::Drawable::mViewMatrix = glm::lookAt(glm::vec3(1, 2, 5), glm::vec3(0), glm::vec3(0, 1, 0));
     drawable.modelMatrix = glm::translate(glm::mat4(1.0f), glm::vec3(0.5f, 2, 3));
     drawable.opacity = 0.25f;
@@ -222,24 +196,22 @@ TEST_F(RenderTest, StandardUniformsAndSamplersAreBoundByNameAndReadAtEachDraw) {
     const GLuint p = program.program;
     const float* view = &vi::Drawable::mViewMatrix[0][0];
     EXPECT_EQ(uniformFloats(p, "uViewMatrix", 16), std::vector<float>(view, view + 16));
-    EXPECT_EQ(uniformFloats(p, "uNormalMatrix", 9)[8], drawable.normalMatrix[2][2]);
-    EXPECT_EQ(uniformFloats(p, "uModelMatrix", 16)[12], 0.5f);
-    EXPECT_EQ(uniformFloats(p, "uModelViewProjectionMatrix", 16)[14], drawable.modelViewProjectionMatrix[3][2]);
-    EXPECT_EQ(uniformFloats(p, "uOpacity", 1), std::vector<float>{0.25f});
-    EXPECT_EQ(uniformFloats(p, "uFirstTexelSize", 2), (std::vector<float>{0.25f, 0.5f}));
-    EXPECT_EQ(uniformFloats(p, "uSecondTexelSize", 2), (std::vector<float>{0.5f, 0.125f}));
+    EXPECT_EQ(Args({uniformFloats(p, "uModelMatrix", 16)[12], uniformFloats(p, "uNormalMatrix", 9)[8],
+                    uniformFloats(p, "uModelViewProjectionMatrix", 16)[14], uniformFloats(p, "uOpacity", 1)[0],
+                    uniformFloats(p, "uFirstTexelSize", 2)[1], uniformFloats(p, "uSecondTexelSize", 2)[1]}),
+              (Args{0.5, drawable.normalMatrix[2][2], drawable.modelViewProjectionMatrix[3][2], 0.25, 0.5, 0.125}));
     // Uniforms, then the textures on units in order, then the draw.
     EXPECT_EQ(GlRecorder::names({"glUniform2fv", "glUniform1i", "glDrawArrays"}),
               (Names{"glUniform2fv", "glUniform2fv", "glUniform2fv", "glUniform1i", "glUniform1i", "glDrawArrays"}));
     const std::vector<GlCall> units = GlRecorder::callsNamed("glUniform1i");
-    EXPECT_EQ(units[0].args, (Args{double(glGetUniformLocation(p, "uFirst")), 0}));
-    EXPECT_EQ(units[1].args, (Args{double(glGetUniformLocation(p, "uSecond")), 1}));
+    EXPECT_EQ(Args({units[0].args[0], units[0].args[1], units[1].args[0], units[1].args[1]}),
+              (Args{double(glGetUniformLocation(p, "uFirst")), 0, double(glGetUniformLocation(p, "uSecond")), 1}));
 }
 
 TEST_F(RenderTest, DynamicArraysAndChangedIndicesGoUpAtTheDrawStaticOnesOnceAndDestructionFreesThem) {
     vi::ShaderProgram program(kVertex, kFragment);
     const unsigned short indices[6] = {0, 1, 2, 2, 1, 3};
-    const float positions[8] = {-1, -1, -1, 1, 1, -1, 1, 1}, offsets[8] = {};
+    const float positions[16] = {}, offsets[8] = {};
     vi::Drawable drawable;
     drawable.mode = GL_TRIANGLES;
     drawable.vertexCount = 4;
@@ -247,20 +219,19 @@ TEST_F(RenderTest, DynamicArraysAndChangedIndicesGoUpAtTheDrawStaticOnesOnceAndD
     drawable.indices = indices;
     vitest::GlRecording recording;
     auto* renderer = new vi::Renderer(program, drawable);
-    EXPECT_EQ(renderer->addAttribute("aPosition", positions, 4, true), 0);
-    EXPECT_EQ(renderer->addAttribute("aOffset", offsets, 2, false), 1);
+    renderer->addAttribute("aPosition", positions, 4, true);
+    renderer->addAttribute("aOffset", offsets, 2, false);
     const std::vector<GlCall> made = GlRecorder::callsNamed("glBufferData");
     EXPECT_EQ(made[0].args, (Args{GL_ELEMENT_ARRAY_BUFFER, 12, address(indices), GL_STATIC_DRAW}));
     EXPECT_EQ(made[1].args, (Args{GL_ARRAY_BUFFER, 64, address(positions), GL_STATIC_DRAW}));
     EXPECT_EQ(made[2].args, (Args{GL_ARRAY_BUFFER, 32, address(offsets), GL_STREAM_DRAW}));
-
-    // Counts are read at draw time; indices go up again only when marked changed.
     GlRecorder::start();
     renderer->render();
     EXPECT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glBindBuffer", "glVertexAttribPointer", "glBindBuffer",
                                           "glBufferData", "glVertexAttribPointer", "glBindBuffer", "glDrawElements"}));
     EXPECT_EQ(GlRecorder::calls()[3].args[1], renderer->attributes[1]->buffer);
     EXPECT_EQ(GlRecorder::calls()[7].args, (Args{GL_TRIANGLES, 6, GL_UNSIGNED_SHORT, 0}));
+    // Counts are read at draw time; indices go up again only when marked changed.
     drawable.vertexCount = drawable.elementCount = 3;
     drawable.indicesChanged = true;
     GlRecorder::start();
@@ -270,7 +241,6 @@ TEST_F(RenderTest, DynamicArraysAndChangedIndicesGoUpAtTheDrawStaticOnesOnceAndD
     ASSERT_EQ(uploads.size(), 2u);
     EXPECT_EQ(uploads[0].args[1], 24);
     EXPECT_EQ(uploads[1].args, (Args{GL_ELEMENT_ARRAY_BUFFER, 6, address(indices), GL_STATIC_DRAW}));
-
     const Args own = {double(renderer->indexBuffer), double(renderer->attributes[0]->buffer),
                       double(renderer->attributes[1]->buffer)};
     GlRecorder::start();
@@ -280,36 +250,41 @@ TEST_F(RenderTest, DynamicArraysAndChangedIndicesGoUpAtTheDrawStaticOnesOnceAndD
     EXPECT_EQ(deleted, own);
 }
 
-TEST_F(RenderTest, EveryUniformTypeReachesTheProgramAndAnUnknownTypeUploadsNothing) {
-    vi::ShaderProgram program("attribute vec2 aPosition;\nuniform mat2 uM2;\nuniform mat3 uM3;\nuniform mat4 uM4;\n"
-                              "uniform int uI1;\nuniform ivec2 uI2;\nuniform ivec3 uI3;\nuniform ivec4 uI4;\n"
-                              "uniform float uF1;\nuniform vec2 uF2;\nuniform vec3 uF3;\nuniform vec4 uF4[2];\n"
-                              "uniform float uUnknown;\nvoid main() {\n"
-                              "  float s = (uM2 * vec2(1.0)).x + (uM3 * vec3(1.0)).y + (uM4 * vec4(1.0)).z\n"
-                              "    + float(uI1 + uI2.y + uI3.z + uI4.w) + uF1 + uF2.y + uF3.z + uF4[0].w + uF4[1].x\n"
-                              "    + uUnknown;\n  gl_Position = vec4(aPosition, s, 1.0);\n}\n",
+TEST_F(RenderTest, EveryUniformTypeReachesTheProgramAnUnknownTypeUploadsNothingAndDepthEqualWins) {
+    const char* types[12] = {"mat2", "mat3", "mat4", "int", "ivec2", "ivec3", "ivec4", "float", "vec2", "vec3", "vec4",
+                             "float"};
+    std::string source = "attribute vec2 aPosition;\n", sum = "0.0";
+    for (int t = 0; t < 12; ++t) {
+        source += std::string("uniform ") + types[t] + " u" + std::to_string(t) + ";\n";
+        sum += " + float(u" + std::to_string(t) + (t < 3 ? "[0][0])" : t % 4 == 3 ? ")" : "[0])");
+    }
+    vi::ShaderProgram program(source + "void main() { gl_Position = vec4(aPosition, " + sum + ", 1.0); }\n",
                               "precision mediump float;\nvoid main() { gl_FragColor = vec4(1.0); }\n");
     vi::Drawable drawable;
     vi::Renderer renderer(program, drawable);
     const float f[16] = {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 16};
     const int i[4] = {7, 8, 9, 10};
-    const Names names = {"uM2", "uM3", "uM4", "uI1", "uI2", "uI3", "uI4", "uF1", "uF2", "uF3", "uF4"};
-    for (int type = 0; type < 11; ++type)
-        renderer.addUniform(names[std::size_t(type)], type >= 3 && type <= 6 ? static_cast<const void*>(i) : f,
-                            vi::Uniform::UniformType(type), type == 10 ? 2 : 1);
-    EXPECT_EQ(renderer.addUniform("uUnknown", f, vi::Uniform::UniformType(11), 1), 11);
+    for (int t = 0; t < 12; ++t)
+        EXPECT_EQ(renderer.addUniform("u" + std::to_string(t), t >= 3 && t <= 6 ? static_cast<const void*>(i) : f,
+                                      vi::Uniform::UniformType(t), 1), t);
     vitest::GlRecording recording;
     renderer.render();
     const Names uploads = {"glUniformMatrix2fv", "glUniformMatrix3fv", "glUniformMatrix4fv", "glUniform1iv",
                            "glUniform2iv", "glUniform3iv", "glUniform4iv", "glUniform1fv", "glUniform2fv",
                            "glUniform3fv", "glUniform4fv"};
     EXPECT_EQ(GlRecorder::names(uploads), uploads);
-    EXPECT_EQ(uniformFloats(program.program, "uM3", 9), std::vector<float>(f, f + 9));
-    EXPECT_EQ(uniformFloats(program.program, "uF4[1]", 4), std::vector<float>(f + 4, f + 8));
-    EXPECT_EQ(uniformFloats(program.program, "uUnknown", 1), std::vector<float>{0.0f});
     GLint ints[4] = {};
-    glGetUniformiv(program.program, glGetUniformLocation(program.program, "uI3"), ints);
-    EXPECT_EQ(std::vector<int>(ints, ints + 3), (std::vector<int>{7, 8, 9}));
+    glGetUniformiv(program.program, glGetUniformLocation(program.program, "u5"), ints);
+    EXPECT_EQ(std::vector<float>({uniformFloats(program.program, "u1", 9)[8], uniformFloats(program.program, "u9", 3)[2],
+                                  uniformFloats(program.program, "u11", 1)[0], float(ints[2])}),
+              (std::vector<float>{9, 3, 0, 9}));
+
+    GLint function = -1;
+    vi::Renderer::setDepthTest(true, false, true);
+    vi::Renderer::setDepthTest(false, true, false);  // disabling keeps the function
+    glGetIntegerv(GL_DEPTH_FUNC, &function);
+    EXPECT_EQ(function, GL_EQUAL);
+    EXPECT_FALSE(glIsEnabled(GL_DEPTH_TEST));
 }
 
 TEST(Drawable, DerivedMatricesTakeTheCentredAffineShortcutAndMatchGlmWhereItHolds) {
@@ -320,15 +295,14 @@ TEST(Drawable, DerivedMatricesTakeTheCentredAffineShortcutAndMatchGlmWhereItHold
     const glm::mat4 view = glm::lookAt(glm::vec3(-2, 3, 6), glm::vec3(0, 1, 0), glm::vec3(0, 1, 0));
     const glm::mat4 moved = glm::translate(glm::mat4(1.0f), glm::vec3(0.5f, -1.0f, -3.0f));
     // Turned, unevenly scaled and moved: the normal matrix is not the rotation.
-    drawable.modelMatrix = glm::scale(glm::rotate(moved, 0.6f, glm::vec3(1, 2, 0.5f)), glm::vec3(2, 0.5f, 1.5f));
-    const glm::mat4 model = drawable.modelMatrix;
+    const glm::mat4 model = glm::scale(glm::rotate(moved, 0.6f, glm::vec3(1, 2, 0.5f)), glm::vec3(2, 0.5f, 1.5f));
+    drawable.modelMatrix = model;
     vi::Drawable::mViewMatrix = view;
     vi::Drawable::mProjectionMatrix = glm::perspective(1.1f, 0.6f, 0.1f, 50.0f);
     drawable.deriveMatrices();
     expectNear(glm::mat4(drawable.normalMatrix), glm::mat4(glm::transpose(glm::inverse(glm::mat3(model)))), 1e-5f);
     expectNear(drawable.modelViewMatrix, view * model, 1e-5f);
     expectNear(drawable.modelViewProjectionMatrix, vi::Drawable::mProjectionMatrix * view * model, 1e-4f);
-
     // An off-centre frustum: only elements 0, 5, 10, 11, 12, 13, 14 and 15
     // count. The bottom rows of the view and the model are never read.
     const glm::mat4 frustum = glm::frustum(-1.0f, 3.0f, -2.0f, 1.0f, 1.0f, 10.0f);
@@ -341,17 +315,4 @@ TEST(Drawable, DerivedMatricesTakeTheCentredAffineShortcutAndMatchGlmWhereItHold
     drawable.deriveMatrices();
     expectNear(drawable.modelViewProjectionMatrix, centred * view * model, 1e-4f);
     vi::Drawable::mProjectionMatrix = vi::Drawable::mViewMatrix = glm::mat4(1.0f);
-}
-
-TEST_F(RenderTest, DepthTestWithoutLessOrGreaterIsEqualAndDisablingKeepsTheFunction) {
-    GLint function = -1;
-    vi::Renderer::setDepthTest(true, false, true);
-    glGetIntegerv(GL_DEPTH_FUNC, &function);
-    EXPECT_EQ(function, GL_EQUAL);
-    EXPECT_TRUE(glIsEnabled(GL_DEPTH_TEST));
-    vi::Renderer::setDepthTest(true, false, false);
-    vi::Renderer::setDepthTest(false, true, true);
-    glGetIntegerv(GL_DEPTH_FUNC, &function);
-    EXPECT_EQ(function, GL_GREATER);
-    EXPECT_FALSE(glIsEnabled(GL_DEPTH_TEST));
 }

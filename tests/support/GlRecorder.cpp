@@ -27,27 +27,23 @@ void GlRecorder::start() {
 
 void GlRecorder::stop() { gRecording = false; }
 
-std::vector<GlCall> GlRecorder::calls() {
+std::vector<GlCall> GlRecorder::calls(const std::vector<std::string>& filter) {
     std::lock_guard<std::mutex> lock(gLogMutex);
-    return gLog;
-}
-
-std::vector<GlCall> GlRecorder::callsNamed(const std::string& name) {
     std::vector<GlCall> result;
-    for (const GlCall& call : calls())
-        if (call.name == name) result.push_back(call);
+    for (const GlCall& call : gLog)
+        if (filter.empty() || std::find(filter.begin(), filter.end(), call.name) != filter.end()) result.push_back(call);
     return result;
 }
+
+std::vector<GlCall> GlRecorder::callsNamed(const std::string& name) { return calls({name}); }
 
 std::vector<std::string> GlRecorder::names(const std::vector<std::string>& filter) {
     std::vector<std::string> result;
-    for (const GlCall& call : calls())
-        if (filter.empty() || std::find(filter.begin(), filter.end(), call.name) != filter.end())
-            result.push_back(call.name);
+    for (const GlCall& call : calls(filter)) result.push_back(call.name);
     return result;
 }
 
-int GlRecorder::count(const std::string& name) { return int(callsNamed(name).size()); }
+int GlRecorder::count(const std::string& name) { return int(calls({name}).size()); }
 
 void GlRecorder::setRendererOverride(const char* renderer) { gRendererOverride = renderer; }
 
@@ -77,11 +73,8 @@ void add(std::vector<double>& args, const char*& text, T value) {
 
 // Calls the driver, then records the call with its arguments and result.
 template <class R, class Real>
-struct Forward {
-    const char* name;
-    Real real;
-    template <class... T>
-    R operator()(T... values) const {
+auto forward(const char* name, Real real) {
+    return [=](auto... values) -> R {
         std::vector<double> args;
         const char* text = nullptr;
         if constexpr (std::is_void_v<R>) {
@@ -94,11 +87,8 @@ struct Forward {
             vitest::GlRecorder::record(name, args, text);
             return result;
         }
-    }
-};
-
-template <class R, class Real>
-Forward<R, Real> forward(const char* name, Real real) { return {name, real}; }
+    };
+}
 
 }  // namespace
 
@@ -114,31 +104,24 @@ WRAP(void, glBindBuffer, (GLenum a, GLuint b), (a, b))
 WRAP(void, glBindFramebuffer, (GLenum a, GLuint b), (a, b))
 WRAP(void, glBindRenderbuffer, (GLenum a, GLuint b), (a, b))
 WRAP(void, glBindTexture, (GLenum a, GLuint b), (a, b))
-WRAP(void, glBlendFunc, (GLenum a, GLenum b), (a, b))
 WRAP(void, glBufferData, (GLenum a, GLsizeiptr b, const void* c, GLenum d), (a, b, c, d))
 WRAP(GLenum, glCheckFramebufferStatus, (GLenum a), (a))
 WRAP(void, glClear, (GLbitfield a), (a))
 WRAP(void, glClearColor, (GLfloat a, GLfloat b, GLfloat c, GLfloat d), (a, b, c, d))
-WRAP(void, glColorMask, (GLboolean a, GLboolean b, GLboolean c, GLboolean d), (a, b, c, d))
 WRAP(void, glCompileShader, (GLuint a), (a))
 WRAP(void, glCompressedTexImage2D, (GLenum a, GLint b, GLenum c, GLsizei d, GLsizei e, GLint f, GLsizei g,
                                     const void* h), (a, b, c, d, e, f, g, h))
 WRAP(GLuint, glCreateProgram, (), ())
 WRAP(GLuint, glCreateShader, (GLenum a), (a))
-WRAP(void, glCullFace, (GLenum a), (a))
 WRAP(void, glDeleteBuffers, (GLsizei a, const GLuint* b), (a, b))
 WRAP(void, glDeleteFramebuffers, (GLsizei a, const GLuint* b), (a, b))
 WRAP(void, glDeleteProgram, (GLuint a), (a))
 WRAP(void, glDeleteRenderbuffers, (GLsizei a, const GLuint* b), (a, b))
 WRAP(void, glDeleteShader, (GLuint a), (a))
 WRAP(void, glDeleteTextures, (GLsizei a, const GLuint* b), (a, b))
-WRAP(void, glDepthFunc, (GLenum a), (a))
-WRAP(void, glDepthMask, (GLboolean a), (a))
 WRAP(void, glDetachShader, (GLuint a, GLuint b), (a, b))
-WRAP(void, glDisable, (GLenum a), (a))
 WRAP(void, glDrawArrays, (GLenum a, GLint b, GLsizei c), (a, b, c))
 WRAP(void, glDrawElements, (GLenum a, GLsizei b, GLenum c, const void* d), (a, b, c, d))
-WRAP(void, glEnable, (GLenum a), (a))
 WRAP(void, glEnableVertexAttribArray, (GLuint a), (a))
 WRAP(void, glFramebufferRenderbuffer, (GLenum a, GLenum b, GLenum c, GLuint d), (a, b, c, d))
 WRAP(void, glFramebufferTexture2D, (GLenum a, GLenum b, GLenum c, GLuint d, GLint e), (a, b, c, d, e))

@@ -23,9 +23,9 @@ public:
     static void start();
     static void stop();
 
-    static std::vector<GlCall> calls();
+    // The recorded calls (or their names) in order; with a filter, only those named in it.
+    static std::vector<GlCall> calls(const std::vector<std::string>& filter = {});
     static std::vector<GlCall> callsNamed(const std::string& name);
-    // Names of the recorded calls in order; with a filter, only those in it.
     static std::vector<std::string> names(const std::vector<std::string>& filter = {});
     static int count(const std::string& name);
 

@@ -15,6 +15,7 @@
 #include "Render/GL.h"
 #include "Render/Renderer.h"
 #include "Render/ShaderProgram.h"
+#include "Render/Texture.h"
 #include "Render/Uniform.h"
 
 namespace vitest {
