@@ -454,15 +454,4 @@ TEST(CurvesTable, RandomSegmentsGiveTheSameBytesOnEveryCpu) {
     EXPECT_EQ(digest, 0x769bbaf6fb9729f6u) << std::hex << digest;
 }
 
-TEST_F(TexturesTest, CurveTextureIsADynamicOneByTwoHundredFiftySixTextureOverTheTable) {
-    const glm::vec2 red[] = {{0, 0}, {255, 255}}, green[] = {{0, 255}, {100, 30}, {255, 180}};
-    vi::Curves curves(red, 2, green, 3, red, 2);
-    EXPECT_FALSE(curves.getTexture()->mIsDeletable);
-    vitest::TexturePainter painter(curves.getTexture());
-    const Words sampled = painter.draw(1, 256);
-    for (int y = 0; y < 256; ++y) ASSERT_EQ(sampled[std::size_t(y)], vitest::rgba(&curves.mTable[4 * y])) << y;
-    curves.mTable[4 * 77 + 3] = 0x5A;
-    EXPECT_EQ(painter.draw(1, 256)[77] & 0xFF, 0x5Au);
-}
-
 }  // namespace
