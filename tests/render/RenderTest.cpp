@@ -132,7 +132,7 @@ TEST_F(RenderTest, ProgramCompilesVertexFirstKeepsNoShaderAndUnbindsItselfBefore
     glUseProgram(program->program);
     GlRecorder::start();
     delete program;
-    EXPECT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glDeleteProgram"}));
+    ASSERT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glDeleteProgram"}));
     EXPECT_EQ(Args({GlRecorder::calls()[0].args[0], GlRecorder::calls()[1].args[0]}), (Args{0, name}));
 }
 

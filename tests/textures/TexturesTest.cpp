@@ -308,7 +308,7 @@ TEST_F(TexturesTest, NestedTargetIsDrawnFirstInsideTheOuterPassAndTheWindowIsBou
     vi::Drawable::mProjectionMatrix = projection;
     GlRecording recording;
     outer.renderFrame();
-    EXPECT_EQ(GlRecorder::names({"glBindFramebuffer", "glClear", "glDrawArrays"}),
+    ASSERT_EQ(GlRecorder::names({"glBindFramebuffer", "glClear", "glDrawArrays"}),
               (Names{"glBindFramebuffer", "glClear", "glBindFramebuffer", "glClear", "glDrawArrays",
                      "glBindFramebuffer", "glDrawArrays", "glBindFramebuffer"}));
     EXPECT_EQ(argumentOf("glBindFramebuffer", 1),
