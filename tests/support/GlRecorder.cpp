@@ -20,9 +20,13 @@ std::atomic<const char*> gRendererOverride{nullptr};
 }  // namespace
 
 void GlRecorder::start() {
+    clear();
+    gRecording = true;
+}
+
+void GlRecorder::clear() {
     std::lock_guard<std::mutex> lock(gLogMutex);
     gLog.clear();
-    gRecording = true;
 }
 
 void GlRecorder::stop() { gRecording = false; }

@@ -22,6 +22,7 @@ public:
     // Clears the log and starts recording; stop() ends it. Recording is off at start.
     static void start();
     static void stop();
+    static void clear();
 
     // The recorded calls (or their names) in order; with a filter, only those named in it.
     static std::vector<GlCall> calls(const std::vector<std::string>& filter = {});
