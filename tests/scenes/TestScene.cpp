@@ -1,8 +1,9 @@
-// The recording scene. Every operation notes itself with the scene members it
-// sees; an atomic flag notices a call that begins while another is running.
+// The recording scene. Every operation notes itself; an atomic flag notices
+// a call that begins while another one is still inside a scene.
 #include <EGL/egl.h>
 #include <GLES2/gl2.h>
 
+#include <algorithm>
 #include <atomic>
 #include <string>
 #include <thread>
@@ -19,7 +20,6 @@ namespace {
 struct Config {
     std::vector<std::string> names;
     int drawResult = 0;
-    int initialOrientation = 0;
     bool clear = false;
     bool picture = false;
     float clearColour[4] = {0.0f, 0.0f, 0.0f, 0.0f};
@@ -34,8 +34,8 @@ void* gLastTextures = nullptr;
 std::atomic<bool> gInside(false);
 std::atomic<int> gOverlaps(0);
 
-// Marks the time spent inside the scene. Gives up the processor once inside,
-// so that a call let in without the lock would find the flag set.
+// Marks the time spent inside a scene. Gives up the processor once inside, so
+// that a call let in without the lock finds the flag set.
 class Inside {
 public:
     Inside() {
@@ -48,8 +48,7 @@ public:
 class RecordingScene : public vi::Scene {
 public:
     RecordingScene(const int* size, vi::TexturesMap* textures, int factory)
-        : vi::Scene(size), mSerial(++gSerial), mFactory(factory), mTextures(textures), mPicture(nullptr) {
-        mOrientation = static_cast<vi::Orientation::OrientationEnum>(gConfig.initialOrientation);
+        : vi::Scene(size), mSerial(++gSerial), mFactory(factory), mTextures(textures) {
         mNames = gConfig.names;
         record(TestSceneCreated, size[0], size[1]);
     }
@@ -66,26 +65,20 @@ public:
     void initEffect() override { note(TestSceneInitEffect); }
     void initEffectAlternate() override { note(TestSceneInitEffectAlternate); }
     int draw() override {
-        Inside inside;
-        record(TestSceneDraw);
+        note(TestSceneDraw);
         if (gConfig.clear) {
-            glClearColor(gConfig.clearColour[0], gConfig.clearColour[1], gConfig.clearColour[2], gConfig.clearColour[3]);
+            const float* c = gConfig.clearColour;
+            glClearColor(c[0], c[1], c[2], c[3]);
             glClear(GL_COLOR_BUFFER_BIT);
         }
         if (gConfig.picture) drawPicture();
         return gConfig.drawResult;
     }
-    void touchDown(const glm::vec2& position) override { noteTouch(TestSceneTouchDown, position); }
-    void touchUp(const glm::vec2& position) override { noteTouch(TestSceneTouchUp, position); }
-    void touchMove(const glm::vec2& position) override { noteTouch(TestSceneTouchMove, position); }
-    void keyPressed(unsigned int key) override {
-        Inside inside;
-        record(TestSceneKeyPressed, int(key));
-    }
-    void param(int a, int b) override {
-        Inside inside;
-        record(TestSceneParam, a, b);
-    }
+    void touchDown(const glm::vec2& at) override { note(TestSceneTouchDown, 0, 0, at.x, at.y); }
+    void touchUp(const glm::vec2& at) override { note(TestSceneTouchUp, 0, 0, at.x, at.y); }
+    void touchMove(const glm::vec2& at) override { note(TestSceneTouchMove, 0, 0, at.x, at.y); }
+    void keyPressed(unsigned int key) override { note(TestSceneKeyPressed, int(key)); }
+    void param(int a, int b) override { note(TestSceneParam, a, b); }
 
 private:
     // Made in the first frame with a context and the image filed, so that its
@@ -99,40 +92,19 @@ private:
         }
         if (mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
     }
-    void note(int kind) {
+    void note(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
         Inside inside;
-        record(kind);
-    }
-    void noteTouch(int kind, const glm::vec2& position) {
-        Inside inside;
-        record(kind, 0, 0, position.x, position.y);
+        record(kind, a, b, x, y);
     }
     void record(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
-        TestSceneEvent event;
-        event.kind = kind;
-        event.scene = mSerial;
-        event.factory = mFactory;
-        event.a = a;
-        event.b = b;
-        event.x = x;
-        event.y = y;
-        event.sizeX = mSize.x;
-        event.sizeY = mSize.y;
-        event.aspect = mAspect;
-        event.scaleX = mScale.x;
-        event.scaleY = mScale.y;
-        event.orientation = int(mOrientation);
-        event.initialised0 = mInitialised[0];
-        event.initialised1 = mInitialised[1];
-        event.now = vi::AnimationManager::mNow;
-        gEvents.push_back(event);
+        gEvents.push_back({kind, mSerial, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});
         ++gCounts[kind];
     }
 
     int mSerial;
     int mFactory;
     vi::TexturesMap* mTextures;
-    vi::Background* mPicture;
+    vi::Background* mPicture = nullptr;
 };
 
 vi::Scene* create(int* size, vi::ModelsMap* models, vi::TexturesMap* textures, int factory) {
@@ -166,32 +138,24 @@ void testSceneReset(void) {
     testSceneClearEvents();
     gConfig = Config();
     gSerial = 0;
-    gLastModels = nullptr;
-    gLastTextures = nullptr;
+    gLastModels = gLastTextures = nullptr;
 }
 
 void testSceneSetNames(const char* const* names, int count) { gConfig.names.assign(names, names + count); }
 void testSceneSetDrawResult(int result) { gConfig.drawResult = result; }
-void testSceneSetInitialOrientation(int orientation) { gConfig.initialOrientation = orientation; }
-
 void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha) {
     gConfig.clear = enabled != 0;
-    gConfig.clearColour[0] = red;
-    gConfig.clearColour[1] = green;
-    gConfig.clearColour[2] = blue;
-    gConfig.clearColour[3] = alpha;
+    const float colour[4] = {red, green, blue, alpha};
+    std::copy(colour, colour + 4, gConfig.clearColour);
 }
-
 void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
 
 int testSceneEventCount(void) { return int(gEvents.size()); }
 TestSceneEvent testSceneEventAt(int index) {
-    if (index < 0 || std::size_t(index) >= gEvents.size()) {
-        TestSceneEvent none = {};
-        none.kind = -1;
-        return none;
-    }
-    return gEvents[std::size_t(index)];
+    if (index >= 0 && std::size_t(index) < gEvents.size()) return gEvents[std::size_t(index)];
+    TestSceneEvent none = {};
+    none.kind = -1;
+    return none;
 }
 int testSceneCount(int kind) { return gCounts[kind]; }
 int testSceneOverlaps(void) { return gOverlaps; }

@@ -17,8 +17,6 @@ extern "C" {
 
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(reset)(JNIEnv*, jclass) { testSceneReset(); }
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(clearEvents)(JNIEnv*, jclass) { testSceneClearEvents(); }
-
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectArray names) {
     std::vector<std::string> copies;
     const jsize count = env->GetArrayLength(names);
@@ -38,10 +36,6 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint res
     testSceneSetDrawResult(result);
 }
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setInitialOrientation)(JNIEnv*, jclass, jint orientation) {
-    testSceneSetInitialOrientation(orientation);
-}
-
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean enabled, jfloat red, jfloat green,
                                                          jfloat blue, jfloat alpha) {
     testSceneSetClearColour(enabled, red, green, blue, alpha);
@@ -55,25 +49,13 @@ JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return te
 
 JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) { return testSceneCount(kind); }
 
-JNIEXPORT jint JNICALL TESTSCENE_NATIVE(overlaps)(JNIEnv*, jclass) { return testSceneOverlaps(); }
-
-// kind, scene, factory, a, b, orientation, initialised0, initialised1
+// kind, scene, factory, a, b
 JNIEXPORT jintArray JNICALL TESTSCENE_NATIVE(eventInts)(JNIEnv* env, jclass, jint index) {
     const TestSceneEvent e = testSceneEventAt(index);
-    const jint values[] = {e.kind, e.scene, e.factory, e.a, e.b, e.orientation, e.initialised0, e.initialised1};
+    const jint values[] = {e.kind, e.scene, e.factory, e.a, e.b};
     const jsize count = jsize(sizeof(values) / sizeof(values[0]));
     jintArray array = env->NewIntArray(count);
     env->SetIntArrayRegion(array, 0, count, values);
-    return array;
-}
-
-// x, y, sizeX, sizeY, aspect, scaleX, scaleY, now
-JNIEXPORT jfloatArray JNICALL TESTSCENE_NATIVE(eventFloats)(JNIEnv* env, jclass, jint index) {
-    const TestSceneEvent e = testSceneEventAt(index);
-    const jfloat values[] = {e.x, e.y, e.sizeX, e.sizeY, e.aspect, e.scaleX, e.scaleY, e.now};
-    const jsize count = jsize(sizeof(values) / sizeof(values[0]));
-    jfloatArray array = env->NewFloatArray(count);
-    env->SetFloatArrayRegion(array, 0, count, values);
     return array;
 }
 

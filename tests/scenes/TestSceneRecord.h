@@ -1,71 +1,46 @@
 #pragma once
 
-// What the test scene saw: one event per call it received, with the call's
-// arguments and the scene members the runtime maintains, as they were during
-// the call. Kept in the plug-in; read by C++ tests through these functions and
-// by Java tests through com.tarq.test.TestScene. Written only from inside the
-// scene's operations, which the runtime serialises; read when the runtime is idle.
+// What the recording test scene saw: one event per call it received, with
+// the call's arguments and what the runtime keeps in the scene during the
+// call. Kept in the plug-in; read by the C++ tests through these functions
+// and by the Java tests through com.tarq.test.TestScene. Written only from
+// inside the scene's operations, which the runtime serialises; read while the
+// runtime is idle.
 
-#if defined(__GNUC__)
 #define TESTSCENE_API __attribute__((visibility("default")))
-#else
-#define TESTSCENE_API
-#endif
 
 #ifdef __cplusplus
 extern "C" {
 #endif
 
 enum TestSceneEventKind {
-    TestSceneCreated,
-    TestSceneDestroyed,
-    TestSceneClearEffect,
-    TestSceneAffordance,
-    TestSceneUnlock,
-    TestSceneTextureUpdated,
-    TestSceneInitEffect,
-    TestSceneInitEffectAlternate,
-    TestSceneDraw,
-    TestSceneTouchDown,
-    TestSceneTouchUp,
-    TestSceneTouchMove,
-    TestSceneKeyPressed,
-    TestSceneParam,
+    TestSceneCreated, TestSceneDestroyed, TestSceneClearEffect, TestSceneAffordance, TestSceneUnlock,
+    TestSceneTextureUpdated, TestSceneInitEffect, TestSceneInitEffectAlternate, TestSceneDraw,
+    TestSceneTouchDown, TestSceneTouchUp, TestSceneTouchMove, TestSceneKeyPressed, TestSceneParam,
     TestSceneEventKindCount
 };
 
 struct TestSceneEvent {
     int kind;
-    int scene;    // serial number of the scene, from 1 after a reset
-    int factory;  // 1: createScene, 2: createSecondScene
-    int a;        // Created: width given to the factory; Param: a; KeyPressed: the key
-    int b;        // Created: height given to the factory; Param: b
-    float x;      // touches: the normalised point
-    float y;
-    float sizeX;  // the scene's members during the call
-    float sizeY;
-    float aspect;
-    float scaleX;
-    float scaleY;
-    int orientation;
-    int initialised0;
-    int initialised1;
-    float now;  // vi::AnimationManager::mNow during the call
+    int scene;        // serial number of the scene, from 1 after a reset
+    int factory;      // 1: createScene, 2: createSecondScene
+    int a, b;         // Created: the size given to the factory; Param: a, b; KeyPressed: a is the key
+    float x, y;       // touches: the normalised point
+    int orientation;  // the scene's orientation during the call
+    float now;        // vi::AnimationManager::mNow during the call
 };
 
-// Forgets every event and the overlap count, and restores the defaults: no
-// names, draw result 0, initial orientation 0, no clearing, no picture.
+// Forgets every event and the overlaps, and restores the defaults: no names,
+// draw result 0, no clearing, no picture, scene serials from 1.
 TESTSCENE_API void testSceneReset(void);
-// Forgets the events, counts and overlaps only; the configuration and the
-// serial numbers of scenes go on.
+// Forgets the events and overlaps only.
 TESTSCENE_API void testSceneClearEvents(void);
 TESTSCENE_API void testSceneSetNames(const char* const* names, int count);
 TESTSCENE_API void testSceneSetDrawResult(int result);
-TESTSCENE_API void testSceneSetInitialOrientation(int orientation);
 // When enabled, draw clears the colour buffer of the current context.
 TESTSCENE_API void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha);
-// When enabled, draw then shows the host's image filed under the scene's first
-// name over the whole frame (while it has client pixels).
+// When enabled, draw then shows the host's image filed under the scene's
+// first name over the whole frame (while it has client pixels).
 TESTSCENE_API void testSceneSetPicture(int enabled);
 
 TESTSCENE_API int testSceneEventCount(void);

@@ -1,18 +1,14 @@
 #pragma once
 
-// A JNIEnv without a Java VM, for calling the runtime's exported JNI entry
-// points from C++ as the host's Java side would: a function table that fills
-// only what those entry points call (strings, int arrays, object arrays),
-// over plain C++ objects. Every other slot is null, so a JNI call the runtime
-// is not expected to make crashes at once.
-//
-// Like a JVM it hands out copies: UTF chars are new[]ed copies that
-// ReleaseStringUTFChars deletes, int array elements a copy that
-// ReleaseIntArrayElements writes back (mode 0 or JNI_COMMIT) and deletes (0
-// or JNI_ABORT). Copies are made with new[], never malloc, so that a test
-// binary that wraps free sees only the runtime's own frees. It counts what was
-// handed out and not given back, and notes misuse. Objects live until reset(),
-// as local references live until the native method returns.
+// A JNIEnv without a Java VM, for calling the runtime's JNI entry points from
+// C++ as the host's Java side would. Only what those entry points call is
+// filled in (strings, int arrays, String arrays); every other slot is null,
+// so an unexpected JNI call crashes at once. Like a JVM it hands out copies
+// (made with new[], never malloc, so that a binary wrapping free sees only the
+// runtime's frees), writes int elements back on release with mode 0 or
+// JNI_COMMIT, counts what was handed out and not given back, and notes misuse.
+// Objects live until reset(), as local references live until the native
+// method returns.
 
 #include <jni.h>
 
@@ -50,17 +46,16 @@ class FakeJni {
 public:
     FakeJni();
     ~FakeJni();
-
     FakeJni(const FakeJni&) = delete;
     FakeJni& operator=(const FakeJni&) = delete;
 
     JNIEnv* env() { return &mEnv; }
-    jobject thiz() { return reinterpret_cast<jobject>(&mThis); }
+    jobject thiz() { return reinterpret_cast<jobject>(this); }
 
     // Java-side values, alive until reset().
     jstring string(const std::string& text);
     jintArray intArray(const std::vector<jint>& values);
-    // The elements of a String[] made by NewObjectArray, or false if `array` is not one.
+    // The elements of a String[] the runtime made, or false if `array` is not one.
     bool stringArrayValues(jobjectArray array, std::vector<std::string>& values) const;
 
     // Handed out and not given back.
@@ -69,39 +64,28 @@ public:
     // Forgets outstanding UTF chars without deleting them, as a JVM whose
     // caller never releases them would: a leak checker then sees them.
     void forgetOutstandingUtfChars() { mUtfChars.clear(); }
-    // A release of something not handed out, and the like.
+    // Releases of something not handed out, and the like.
     const std::vector<std::string>& misuses() const { return mMisuses; }
-    // Called with the JNI function's name as each call begins.
-    void setObserver(void (*observer)(const char* function)) { mObserver = observer; }
-
     // Ends the "native call": local references die.
     void reset();
 
     struct Object;
 
 private:
-    static FakeJni& self(JNIEnv* env, const char* function);
-    static const char* getStringUtfChars(JNIEnv* env, jstring string, jboolean* isCopy);
-    static void releaseStringUtfChars(JNIEnv* env, jstring string, const char* chars);
-    static jint* getIntArrayElements(JNIEnv* env, jintArray array, jboolean* isCopy);
-    static void releaseIntArrayElements(JNIEnv* env, jintArray array, jint* elements, jint mode);
-    static jclass findClass(JNIEnv* env, const char* name);
-    static jstring newStringUtf(JNIEnv* env, const char* chars);
-    static jobjectArray newObjectArray(JNIEnv* env, jsize length, jclass elementClass, jobject initial);
-    static void setObjectArrayElement(JNIEnv* env, jobjectArray array, jsize index, jobject value);
-
-    Object* make(int kind);
-    Object* object(void* handle, int kind) const;
-
-    JNINativeInterface_ mTable;
-    JNIEnv mEnv;
-    int mThis;
-    void (*mObserver)(const char* function);
-    std::vector<std::unique_ptr<Object>> mObjects;
     struct Lease {
         const void* pointer;
         Object* owner;
     };
+    static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
+    Object* make(int kind, const std::string& text = {});
+    Object* find(const void* handle, int kind) const;
+    template <typename T>
+    T* lease(std::vector<Lease>& leases, Object* owner, const T* from, std::size_t count, const char* what);
+    bool giveBack(std::vector<Lease>& leases, const void* pointer, Object* owner, const char* what);
+
+    JNINativeInterface_ mTable;
+    JNIEnv mEnv;
+    std::vector<std::unique_ptr<Object>> mObjects;
     std::vector<Lease> mUtfChars;
     std::vector<Lease> mElements;
     std::vector<std::string> mMisuses;
