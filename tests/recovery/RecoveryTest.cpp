@@ -1,248 +1,258 @@
-// A ready scene across lost contexts, driven through the handlers: a frame
-// after the host replaced, destroyed or dropped the context, or after the
-// driver lost objects under the same context handle, re-creates every
-// program, buffer and texture before the scene draws, and looks exactly like
-// the frame before.
+// A ready scene showing the host's image across lost contexts, driven through
+// the handlers and the JNI entry point: a frame after the host replaced,
+// destroyed or dropped the context, or after the driver lost objects under
+// the same context handle, re-creates every program, buffer and texture before
+// the scene draws, and looks exactly like the frame before. Then the host's
+// images themselves: replaced, replaced early, unloaded, and converted.
 #include <gtest/gtest.h>
+#include <pthread.h>
 
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <memory>
-#include <vector>
 
 #include "Application/Application.h"
 #include "Application/ApplicationVar.h"
-#include "GlContext.h"
+#include "Entry/HostImage.h"
+#include "FakeJni.h"
 #include "GlRecorder.h"
-#include "Painters.h"
 #include "Pictures.h"
-#include "Render/Background.h"
 #include "Render/Renderer.h"
-#include "Render/Texture.h"
+#include "TestSceneRecord.h"
 
-using vitest::GlContext;
+extern "C" vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);
+extern "C" void __real_free(void* p);
+extern "C" void __wrap_free(void* p) {
+    if (p) vitest::GlRecorder::record("free", {double(reinterpret_cast<std::uintptr_t>(p))});
+    __real_free(p);
+}
+
+using namespace vi;
 using vitest::GlRecorder;
 using vitest::GlRecording;
 using Frame = std::vector<std::uint32_t>;
-
-extern "C" void __real_free(void* p);
-extern "C" void __wrap_free(void* p) {
-    if (p) GlRecorder::record("free", {double(reinterpret_cast<std::uintptr_t>(p))});
-    __real_free(p);
-}
+using Names = std::vector<std::string>;
 
 namespace {
 
 constexpr int kSize = 64;
 
-// RGBA bytes of the three textures: every texel a distinct colour.
-std::vector<std::uint8_t> gTexels[3] = {
-    {0xD0, 0x20, 0x10, 0xFF, 0x20, 0xC0, 0x30, 0xFF, 0x30, 0x40, 0xB0, 0xFF, 0xE0, 0xE0, 0xE0, 0xFF},
-    {0xF0, 0xF0, 0x00, 0xFF, 0x00, 0xF0, 0xF0, 0xFF, 0xF0, 0x00, 0xF0, 0xFF, 0x40, 0x20, 0x00, 0xFF},
-    {0x80, 0x80, 0x00, 0xFF, 0x00, 0x80, 0x80, 0xFF, 0x80, 0x00, 0x80, 0xFF, 0x10, 0xA0, 0xFF, 0xFF}};
-
-// As an effect makes one: a background over a static texture whose malloc'ed
-// pixels the runtime may free, then two indexed quads drawn by two renderers
-// that share one program, the first sampling a static texture over the
-// scene's own pixels, the second a dynamic one (uploaded at every bind).
-// Nearest filtering: a frame is exact, and a texture lost on the way shows.
-class ReadyScene : public vi::Scene {
-public:
-    explicit ReadyScene(const int* size) : vi::Scene(size) {}
-    ~ReadyScene() override {
-        for (vi::Renderer* renderer : quads) delete renderer;
-        delete program;
-        delete background;
-        for (vi::Texture* texture : textures) delete texture;
-    }
-
-    void initEffect() override {
-        void* backgroundPixels = std::malloc(16);
-        std::memcpy(backgroundPixels, gTexels[0].data(), 16);
-        for (int i = 0; i < 3; ++i)
-            textures[i] = new vi::Texture(i ? gTexels[i].data() : backgroundPixels, 2, 2, i < 2, false, false, false,
-                                          false, 4, false);
-        textures[0]->setDeletable(true);
-        background = new vi::Background(*textures[0]);
-        program = new vi::ShaderProgram(
-            "attribute vec2 aPosition;\nuniform vec2 uOffset;\nvarying vec2 vTexCoord;\n"
-            "void main() { vTexCoord = aPosition * 2.0; gl_Position = vec4(aPosition + uOffset, 0.0, 1.0); }\n",
-            vitest::textureFragmentShader());
-        static const float kCorners[] = {0.0f, 0.0f, 0.5f, 0.0f, 0.0f, 0.5f, 0.5f, 0.5f};
-        static const unsigned short kIndices[] = {0, 1, 2, 2, 1, 3};
-        static const float kOffsets[2][2] = {{-0.5f, -0.5f}, {0.0f, 0.0f}};
-        for (int i = 0; i < 2; ++i) {
-            quad.mode = GL_TRIANGLES;
-            quad.indices = kIndices;
-            quad.elementCount = 6;
-            quad.vertexCount = 4;
-            quads[i] = new vi::Renderer(*program, quad);
-            EXPECT_EQ(0, quads[i]->addAttribute("aPosition", kCorners, 2, true));
-            EXPECT_EQ(0, quads[i]->addUniform("uOffset", kOffsets[i], vi::Uniform::Float2, 1));
-            quads[i]->addTexture("uTexture", textures[i + 1]);
-        }
-    }
-    int draw() override {
-        glClearColor(0.0f, 0.0f, 0.0f, 1.0f);
-        glClear(GL_COLOR_BUFFER_BIT);
-        background->renderFrame();
-        quads[0]->render();
-        quads[1]->render();
-        return 7;
-    }
-
-    static ReadyScene& current() { return *static_cast<ReadyScene*>(vi::gpScene); }
-
-    vi::Texture* textures[3] = {};
-    vi::Background* background = nullptr;
-    vi::ShaderProgram* program = nullptr;
-    vi::Drawable quad;
-    vi::Renderer* quads[2] = {};
-};
-
-Frame drawFrame() {
-    EXPECT_EQ(7, vi::Application::handleDraw());
-    return vitest::readWords(0, 0, kSize, kSize);
-}
-
-bool allProgramsValid() {
-    for (vi::Renderer* renderer : vi::Renderer::mAllRenderers)
-        if (glIsProgram(renderer->program->program) != GL_TRUE) return false;
-    return true;
-}
-
 class Recovery : public ::testing::Test {
 protected:
     void SetUp() override {
-        ASSERT_TRUE(vi::Renderer::mAllRenderers.empty() && vi::Texture::mAllTextures.empty()) << "left by a test";
-        context.reset(new GlContext(kSize, kSize));
-        vi::gCreateScene = [](int* size, vi::ModelsMap*, vi::TexturesMap*) -> vi::Scene* { return new ReadyScene(size); };
-        vi::Application::handleStart(0, 0, kSize, kSize);
-        vi::Application::handleInitEffect();
-        reference = drawFrame();
-        // Every texel of the three textures is on screen.
-        for (const std::vector<std::uint8_t>& texels : gTexels)
-            for (int i = 0; i < 16; i += 4)
-                EXPECT_NE(std::count(reference.begin(), reference.end(), vitest::rgba(&texels[i])), 0) << i;
+        ASSERT_TRUE(Renderer::mAllRenderers.empty() && Texture::mAllTextures.empty()) << "left by a test";
+        context.reset(new vitest::GlContext(kSize, kSize));
+        const char* names[] = {"sky"};
+        testSceneReset();
+        testSceneSetNames(names, 1);
+        testSceneSetPicture(1);
+        testSceneSetClearColour(1, 0.0f, 0.0f, 0.0f, 1.0f);
+        testSceneSetDrawResult(7);
+        gCreateScene = createScene;
+        load("sky", {jint(0xFFD02010), jint(0xFF20C030), jint(0xFF3040B0), jint(0x80E0E0E0)}, 2, 2);
+        load("sea", {1, 2}, 1, 2);
+        Application::handleStart(0, 0, kSize, kSize);
+        Application::handleInitEffect();
+        reference = frame();
+        EXPECT_NE(reference, Frame(kSize * kSize, 0x000000FFu)) << "the picture shows";
     }
     void TearDown() override {
         context->makeCurrent();
-        vi::Application::handleStop();
+        Application::handleStop();
+        for (auto& filed : ApplicationVar::msTexturesMap)
+            if (std::count(Texture::mAllTextures.begin(), Texture::mAllTextures.end(), filed.second)) delete filed.second;
+        ApplicationVar::msTexturesMap.clear();
+        EXPECT_EQ(jni.misuses(), Names{});
+        EXPECT_EQ(0, jni.outstandingUtfChars() + jni.outstandingElements()) << "JNI copies not released";
         context.reset();
     }
 
-    std::unique_ptr<GlContext> context;
+    // The host's call: a name and its pixels (none: an unload).
+    Texture* load(const char* name, std::vector<jint> pixels, int width, int height) {
+        VI_NATIVE(loadTexture)(jni.env(), nullptr, jni.string(name), pixels.empty() ? nullptr : jni.intArray(pixels),
+                               width, height);
+        jni.reset();
+        return ApplicationVar::msTexturesMap[name];
+    }
+    static Frame frame() {
+        EXPECT_EQ(7, Application::handleDraw());
+        return vitest::readWords(0, 0, kSize, kSize);
+    }
+    static bool allProgramsValid() {
+        for (Renderer* renderer : Renderer::mAllRenderers)
+            if (glIsProgram(renderer->program->program) != GL_TRUE) return false;
+        return true;
+    }
+
+    std::unique_ptr<vitest::GlContext> context;
+    vitest::FakeJni jni;
     Frame reference;
 };
 
-TEST_F(Recovery, FrameStaysTheSameThroughManyContextsAndFramesWithoutOne) {
-    for (int round = 0; round < 16; ++round) {
+}  // namespace
+
+TEST_F(Recovery, FrameStaysTheSameThroughManyContextsRestartsAndFramesWithoutOne) {
+    for (int round = 0; round < 15; ++round) {
         SCOPED_TRACE(round);
-        switch (round % 4) {
+        switch (round % 5) {
         case 0: context->makeSecondCurrent(); break;
         case 1: context->recreate(); break;
         case 2:
             // Without a context the frame only forgets every name; nothing can be made.
-            GlContext::releaseCurrent();
-            vi::Application::handleDraw();
-            for (vi::Renderer* renderer : vi::Renderer::mAllRenderers) EXPECT_EQ(0u, renderer->program->program);
-            for (vi::Texture* texture : vi::Texture::mAllTextures) EXPECT_EQ(0u, texture->mId);
+            vitest::GlContext::releaseCurrent();
+            Application::handleDraw();
+            for (Renderer* renderer : Renderer::mAllRenderers) EXPECT_EQ(0u, renderer->program->program);
+            for (Texture* texture : Texture::mAllTextures) EXPECT_EQ(0u, texture->mId);
             context->makeCurrent();
             break;
-        case 3: context->makeCurrent(); break;
+        case 3:
+            // A start in another context only forgets; the first ready frame makes again.
+            context->makeSecondCurrent();
+            Application::handleRestart();
+            for (Renderer* renderer : Renderer::mAllRenderers) EXPECT_EQ(0u, renderer->program->program);
+            break;
+        case 4: context->makeCurrent(); break;
         }
-        ASSERT_EQ(reference, drawFrame());
+        ASSERT_EQ(reference, frame());
         ASSERT_TRUE(allProgramsValid());
     }
 }
 
-// The order is the behaviour: every renderer forgets, every texture forgets,
-// then the renderers are made again in registry order (a shared program once),
-// then the textures, all before the scene's first call; no probe is asked
-// once the context is known to have changed.
-TEST_F(Recovery, ChangedContextRebuildsRenderersInOrderThenTexturesBeforeTheScene) {
+// The order is the behaviour: renderers and textures forget their names, then
+// the renderers are made again in registry order, then the textures, all
+// before the scene's first call, and without asking a probe once the context
+// is known to have changed.
+TEST_F(Recovery, ChangedContextRebuildsRenderersThenTexturesBeforeTheSceneOnce) {
     context->makeSecondCurrent();
-    {
+    for (int pass = 0; pass < 2; ++pass) {
         GlRecording recording;
-        EXPECT_EQ(reference, drawFrame());
-        const std::vector<std::string> made = GlRecorder::names(
-            {"glCreateProgram", "glIsProgram", "glGenBuffers", "glGetUniformLocation", "glGenTextures", "glIsTexture", "glClear"});
-        EXPECT_EQ(made, (std::vector<std::string>{
-                            "glCreateProgram", "glGenBuffers",                                  // the background
-                            "glCreateProgram", "glGenBuffers", "glGenBuffers", "glGetUniformLocation",  // first quad
-                            "glIsProgram", "glGenBuffers", "glGenBuffers", "glGetUniformLocation",      // second quad
-                            "glGenTextures", "glGenTextures", "glGenTextures", "glClear"}));
+        EXPECT_EQ(reference, frame());
+        EXPECT_EQ(GlRecorder::names({"glCreateProgram", "glIsProgram", "glGenBuffers", "glGenTextures", "glIsTexture",
+                                     "glClear"}),
+                  pass ? (Names{"glIsProgram", "glIsTexture", "glClear"})
+                       : (Names{"glCreateProgram", "glGenBuffers", "glGenTextures", "glGenTextures", "glClear"}));
     }
-    EXPECT_EQ(context->secondContext(), vi::Renderer::mEglContext);
-    GlRecording recording;
-    EXPECT_EQ(reference, drawFrame());
-    EXPECT_EQ(0, GlRecorder::count("glCreateProgram") + GlRecorder::count("glGenTextures")) << "once is enough";
 }
 
 // A driver may hand a new context the handle of a lost one: the first
 // renderer's program and the first texture with a name are asked on every
-// frame (and nothing else), and either one gone means everything is made again.
+// frame, and either one gone means everything is made again.
 TEST_F(Recovery, ObjectsGoneUnderTheSameContextHandleAreNoticed) {
-    {
-        GlRecording recording;
-        EXPECT_EQ(reference, drawFrame());
-        EXPECT_EQ(0, GlRecorder::count("glCreateProgram") + GlRecorder::count("glGenTextures"));
-        ASSERT_EQ(1u, GlRecorder::callsNamed("glIsProgram").size());
-        ASSERT_EQ(1u, GlRecorder::callsNamed("glIsTexture").size());
-        EXPECT_EQ(vi::Renderer::mAllRenderers.front()->program->program, GlRecorder::callsNamed("glIsProgram")[0].args[0]);
-        EXPECT_EQ(vi::Texture::mAllTextures.front()->mId, GlRecorder::callsNamed("glIsTexture")[0].args[0]);
-    }
     for (int gone = 0; gone < 2; ++gone) {
         SCOPED_TRACE(gone ? "texture" : "program");
-        if (gone) glDeleteTextures(1, &vi::Texture::mAllTextures.front()->mId);
-        else glDeleteProgram(vi::Renderer::mAllRenderers.front()->program->program);
+        {
+            GlRecording recording;
+            frame();
+            EXPECT_EQ(Renderer::mAllRenderers.front()->program->program, GlRecorder::callsNamed("glIsProgram").at(0).args[0]);
+            EXPECT_EQ(Texture::mAllTextures.front()->mId, GlRecorder::callsNamed("glIsTexture").at(0).args[0]);
+        }
+        if (gone) glDeleteTextures(1, &Texture::mAllTextures.front()->mId);
+        else glUseProgram(0), glDeleteProgram(Renderer::mAllRenderers.front()->program->program);  // not in use: gone at once
         GlRecording recording;
-        EXPECT_EQ(reference, drawFrame());
-        EXPECT_EQ(3, GlRecorder::count("glGenTextures"));
+        EXPECT_EQ(reference, frame());
+        EXPECT_EQ(GlRecorder::count("glGenTextures"), 2);
         EXPECT_TRUE(allProgramsValid());
     }
 }
 
-// Recycling drops the static textures' pixels (freeing only the ones the
-// runtime may free); after a loss they come back as storage of undefined
-// contents, and the dynamic texture, which kept its pixels, still shows them.
+// Recycling frees the static textures' pixels; after a loss they come back
+// as storage of undefined contents (and the scene leaves the picture out).
 TEST_F(Recovery, RecycledStaticTexturesComeBackAfterALoss) {
-    ReadyScene& scene = ReadyScene::current();
-    const double freeable = double(reinterpret_cast<std::uintptr_t>(scene.textures[0]->mBuffer));
+    const double sky = double(reinterpret_cast<std::uintptr_t>(ApplicationVar::msTexturesMap["sky"]->mBuffer));
     {
         GlRecording recording;
-        vi::Application::handleRecycleTextures();
-        ASSERT_EQ(1u, GlRecorder::callsNamed("free").size());
-        EXPECT_EQ(freeable, GlRecorder::callsNamed("free")[0].args[0]);
+        Application::handleRecycleTextures();
+        ASSERT_EQ(2u, GlRecorder::callsNamed("free").size());
+        EXPECT_EQ(sky, GlRecorder::callsNamed("free")[0].args[0]);
     }
-    EXPECT_TRUE(scene.textures[0]->mBuffer == nullptr && scene.textures[1]->mBuffer == nullptr);
     context->makeSecondCurrent();
     GlRecording recording;
-    const Frame frame = drawFrame();
+    frame();
     int nullUploads = 0;
     for (const vitest::GlCall& call : GlRecorder::callsNamed("glTexImage2D")) nullUploads += call.args.back() == 0.0;
     EXPECT_EQ(2, nullUploads);
-    for (int i = 0; i < 16; i += 4)
-        EXPECT_NE(std::count(frame.begin(), frame.end(), vitest::rgba(&gTexels[2][i])), 0) << i;
+    EXPECT_TRUE(allProgramsValid());
 }
 
-// A renderer that outlives its scene, as one an effect keeps across restarts:
-// a start in a new context only forgets its names, the initialisation leaves
-// them alone, and the first ready frame makes them again.
-TEST_F(Recovery, LossNoticedByAStartIsRepairedByTheFirstReadyFrame) {
-    vi::ShaderProgram survivorProgram(ReadyScene::current().program->vertexSource,
-                                      ReadyScene::current().program->fragmentSource);
-    vi::Drawable survivorDrawable;
-    vi::Renderer survivor(survivorProgram, survivorDrawable);
-    context->makeSecondCurrent();
-    vi::Application::handleStart(0, 0, kSize, kSize);
-    EXPECT_EQ(0, vi::Application::handleDraw());
-    vi::Application::handleInitEffect();
-    EXPECT_EQ(0u, survivorProgram.program);
-    EXPECT_EQ(reference, drawFrame());
-    EXPECT_EQ(GLboolean(GL_TRUE), glIsProgram(survivorProgram.program));
-    vi::Application::handleStop();
+// Replacing frees the old pixels and uploads the new ones at the new size
+// into the same texture, shown at the next frame; the scene is told, and no
+// lock is taken (the test holds it: a replace that took it would never return).
+TEST_F(Recovery, ReplacingAHostImageFreesUploadsAtTheNewSizeAndTellsTheSceneWithoutTheLock) {
+    Texture* sky = ApplicationVar::msTexturesMap["sky"];
+    const double firstBuffer = double(reinterpret_cast<std::uintptr_t>(sky->mBuffer));
+    testSceneClearEvents();
+    {
+        GlRecording recording;
+        pthread_mutex_lock(&ApplicationVar::msCriticalSection);
+        EXPECT_EQ(sky, load("sky", std::vector<jint>(6, jint(0xFF102030u)), 3, 2));
+        pthread_mutex_unlock(&ApplicationVar::msCriticalSection);
+        EXPECT_EQ(GlRecorder::names({"free", "glTexImage2D"}), (Names{"free", "glTexImage2D"}));
+        EXPECT_EQ(firstBuffer, GlRecorder::callsNamed("free")[0].args[0]);
+        const std::vector<double> upload = GlRecorder::callsNamed("glTexImage2D")[0].args;
+        EXPECT_EQ((std::vector<double>{3, 2}), std::vector<double>(upload.begin() + 3, upload.begin() + 5));
+    }
+    EXPECT_EQ(1, testSceneCount(TestSceneTextureUpdated));
+    EXPECT_EQ(glm::vec2(1.0f / 3.0f, 0.5f), sky->mTexelSize);
+    EXPECT_EQ(Frame(kSize * kSize, 0x102030FFu), frame());
 }
 
-}  // namespace
+// A second load before anything allocated the image: the upload had no
+// texture of its own, so the first allocation defines the storage in full.
+TEST_F(Recovery, HostImageReplacedBeforeItsFirstAllocationIsUploadedInFull) {
+    load("early", {jint(0xFF0000FFu)}, 1, 1);
+    Texture* early = load("early", {1, 2, 3, 4}, 2, 2);
+    GlRecording recording;
+    early->allocate();
+    ASSERT_EQ(1u, GlRecorder::callsNamed("glTexImage2D").size());
+    EXPECT_EQ(0, GlRecorder::count("glTexSubImage2D"));
+    EXPECT_EQ(2, GlRecorder::callsNamed("glTexImage2D")[0].args[3]);
+}
+
+// Unloading a name never loaded files a null entry that a later load fills;
+// unloading a loaded one deletes the texture and leaves the stale pointer.
+TEST_F(Recovery, UnloadingAHostImageDeletesItsTextureAndKeepsThePointer) {
+    EXPECT_EQ(nullptr, load("later", {}, 4, 4));
+    EXPECT_EQ(1u, ApplicationVar::msTexturesMap.count("later"));
+    Texture* later = load("later", {7}, 1, 1);
+    ASSERT_NE(nullptr, later);
+    EXPECT_EQ(later, load("later", {}, 1, 1));
+    EXPECT_EQ(0, std::count(Texture::mAllTextures.begin(), Texture::mAllTextures.end(), later));
+}
+
+// The form each CPU the runtime ships for must take: a build that falls back
+// to the portable loop (NEON or SSSE3 not compiled in) fails here.
+TEST(HostImage, TakesTheByteShuffleOfThisCpu) {
+#if defined(__aarch64__)
+    EXPECT_STREQ(HostImage::shuffleName(), "NEON");
+    EXPECT_TRUE(HostImage::hasShuffle());
+#elif defined(__x86_64__)
+    EXPECT_STREQ(HostImage::shuffleName(), "SSSE3");
+    EXPECT_EQ(HostImage::hasShuffle(), __builtin_cpu_supports("ssse3") != 0);
+#endif
+}
+
+// Every form on every length from 1 to 67 (each tail, several whole vectors)
+// with both pointers at each misalignment, and on a full 1080 x 1920 screen:
+// each pixel's bytes 0 and 2 trade places in the host's array and in the
+// texture's bytes, and nothing outside the pixels moves.
+TEST(HostImage, FormsAgreeOnOddLengthsAndUnalignedPointers) {
+    std::vector<void (*)(void*, void*, std::size_t)> forms = {HostImage::toTextureBytes,
+                                                              HostImage::toTextureBytesPortable};
+    if (HostImage::hasShuffle()) forms.push_back(HostImage::toTextureBytesShuffled);
+    auto check = [](void (*form)(void*, void*, std::size_t), std::size_t count, std::size_t hostAt, std::size_t textureAt) {
+        auto byte = [](std::size_t i) { return (unsigned char)(i * 37 + i / 256 + 1); };
+        std::vector<unsigned char> host(count * 4 + 8, 0x5A), texture = host, wantHost = host, wantTexture = host;
+        for (std::size_t i = 0; i < count * 4; ++i) {
+            host[hostAt + i] = byte(i);
+            wantHost[hostAt + i] = wantTexture[textureAt + i] = byte(i % 2 ? i : i ^ 2);
+        }
+        form(&host[hostAt], &texture[textureAt], count);
+        ASSERT_TRUE(host == wantHost && texture == wantTexture) << count << " " << hostAt << " " << textureAt;
+    };
+    for (std::size_t form = 0; form < forms.size(); ++form) {
+        SCOPED_TRACE(form);
+        for (std::size_t count = 1; count <= 67; ++count)
+            for (std::size_t offsets = 0; offsets < 16; ++offsets) check(forms[form], count, offsets / 4, offsets % 4);
+        check(forms[form], 1080 * 1920, 1, 3);
+    }
+}

@@ -20,24 +20,21 @@ namespace {
 struct Config {
     std::vector<std::string> names;
     int drawResult = 0;
-    bool clear = false;
-    bool picture = false;
-    float clearColour[4] = {0.0f, 0.0f, 0.0f, 0.0f};
+    bool clear = false, picture = false;
+    float clearColour[4] = {};
 };
 
 Config gConfig;
 std::vector<TestSceneEvent> gEvents;
 int gCounts[TestSceneEventKindCount];
 int gSerial = 0;
-void* gLastModels = nullptr;
-void* gLastTextures = nullptr;
+void* gLastMaps[2] = {};
 std::atomic<bool> gInside(false);
 std::atomic<int> gOverlaps(0);
 
 // Marks the time spent inside a scene. Gives up the processor once inside, so
 // that a call let in without the lock finds the flag set.
-class Inside {
-public:
+struct Inside {
     Inside() {
         if (gInside.exchange(true)) ++gOverlaps;
         std::this_thread::yield();
@@ -53,8 +50,7 @@ public:
         record(TestSceneCreated, size[0], size[1]);
     }
     ~RecordingScene() override {
-        Inside inside;
-        record(TestSceneDestroyed);
+        note(TestSceneDestroyed);
         delete mPicture;
     }
 
@@ -64,34 +60,28 @@ public:
     void textureUpdated() override { note(TestSceneTextureUpdated); }
     void initEffect() override { note(TestSceneInitEffect); }
     void initEffectAlternate() override { note(TestSceneInitEffectAlternate); }
-    int draw() override {
-        note(TestSceneDraw);
-        if (gConfig.clear) {
-            const float* c = gConfig.clearColour;
-            glClearColor(c[0], c[1], c[2], c[3]);
-            glClear(GL_COLOR_BUFFER_BIT);
-        }
-        if (gConfig.picture) drawPicture();
-        return gConfig.drawResult;
-    }
     void touchDown(const glm::vec2& at) override { note(TestSceneTouchDown, 0, 0, at.x, at.y); }
     void touchUp(const glm::vec2& at) override { note(TestSceneTouchUp, 0, 0, at.x, at.y); }
     void touchMove(const glm::vec2& at) override { note(TestSceneTouchMove, 0, 0, at.x, at.y); }
     void keyPressed(unsigned int key) override { note(TestSceneKeyPressed, int(key)); }
     void param(int a, int b) override { note(TestSceneParam, a, b); }
-
-private:
-    // Made in the first frame with a context and the image filed, so that its
-    // GL names come from a frame the runtime has checked the context for. Left
-    // out while the image has no client pixels: recycled, it may come back
-    // from a lost context undefined.
-    void drawPicture() {
-        if (!mPicture && !mNames.empty() && eglGetCurrentContext() != EGL_NO_CONTEXT) {
+    int draw() override {
+        note(TestSceneDraw);
+        const float* c = gConfig.clearColour;
+        if (gConfig.clear) glClearColor(c[0], c[1], c[2], c[3]), glClear(GL_COLOR_BUFFER_BIT);
+        // The picture is made in the first frame with a context and the image
+        // filed, so that its GL names come from a frame the runtime checked
+        // the context for; left out while the image has no client pixels
+        // (recycled, it may come back from a lost context undefined).
+        if (gConfig.picture && !mPicture && !mNames.empty() && eglGetCurrentContext() != EGL_NO_CONTEXT) {
             auto filed = mTextures->find(mNames[0]);
             if (filed != mTextures->end() && filed->second) mPicture = new vi::Background(*filed->second);
         }
-        if (mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
+        if (gConfig.picture && mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
+        return gConfig.drawResult;
     }
+
+private:
     void note(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
         Inside inside;
         record(kind, a, b, x, y);
@@ -101,16 +91,15 @@ private:
         ++gCounts[kind];
     }
 
-    int mSerial;
-    int mFactory;
+    int mSerial, mFactory;
     vi::TexturesMap* mTextures;
     vi::Background* mPicture = nullptr;
 };
 
 vi::Scene* create(int* size, vi::ModelsMap* models, vi::TexturesMap* textures, int factory) {
     Inside inside;
-    gLastModels = models;
-    gLastTextures = textures;
+    gLastMaps[0] = models;
+    gLastMaps[1] = textures;
     return new RecordingScene(size, textures, factory);
 }
 
@@ -121,7 +110,6 @@ extern "C" {
 TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures) {
     return create(size, models, textures, 1);
 }
-
 // Not looked up by the runtime: a test puts it into vi::gCreateScene to tell
 // which factory made a scene.
 TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures) {
@@ -130,36 +118,30 @@ TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap* models, vi:
 
 void testSceneClearEvents(void) {
     gEvents.clear();
-    for (int& count : gCounts) count = 0;
+    std::fill(gCounts, gCounts + TestSceneEventKindCount, 0);
     gOverlaps = 0;
 }
-
 void testSceneReset(void) {
     testSceneClearEvents();
     gConfig = Config();
     gSerial = 0;
-    gLastModels = gLastTextures = nullptr;
+    gLastMaps[0] = gLastMaps[1] = nullptr;
 }
-
 void testSceneSetNames(const char* const* names, int count) { gConfig.names.assign(names, names + count); }
 void testSceneSetDrawResult(int result) { gConfig.drawResult = result; }
 void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha) {
-    gConfig.clear = enabled != 0;
-    const float colour[4] = {red, green, blue, alpha};
-    std::copy(colour, colour + 4, gConfig.clearColour);
+    gConfig = {gConfig.names, gConfig.drawResult, enabled != 0, gConfig.picture, {red, green, blue, alpha}};
 }
 void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
 
 int testSceneEventCount(void) { return int(gEvents.size()); }
 TestSceneEvent testSceneEventAt(int index) {
     if (index >= 0 && std::size_t(index) < gEvents.size()) return gEvents[std::size_t(index)];
-    TestSceneEvent none = {};
-    none.kind = -1;
-    return none;
+    return TestSceneEvent{-1, 0, 0, 0, 0, 0.0f, 0.0f, 0, 0.0f};
 }
 int testSceneCount(int kind) { return gCounts[kind]; }
 int testSceneOverlaps(void) { return gOverlaps; }
-void* testSceneLastModelsMap(void) { return gLastModels; }
-void* testSceneLastTexturesMap(void) { return gLastTextures; }
+void* testSceneLastModelsMap(void) { return gLastMaps[0]; }
+void* testSceneLastTexturesMap(void) { return gLastMaps[1]; }
 
 }  // extern "C"

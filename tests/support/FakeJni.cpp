@@ -11,42 +11,37 @@ enum Kind { kString, kIntArray, kObjectArray, kClass };
 
 }  // namespace
 
-struct FakeJni::Object {
-    int kind;
-    std::string text;              // kString; kClass and kObjectArray: the (element) class name
-    std::vector<jint> ints;        // kIntArray
-    std::vector<Object*> objects;  // kObjectArray
-};
-
 FakeJni::FakeJni() {
     std::memset(&mTable, 0, sizeof(mTable));
     mTable.reserved0 = this;
     mTable.GetStringUTFChars = [](JNIEnv* env, jstring string, jboolean* isCopy) -> const char* {
         FakeJni& jni = self(env);
         Object* owner = jni.find(string, kString);
+        if (!owner) return jni.mMisuses.push_back("GetStringUTFChars of no string"), nullptr;
+        char* copy = new char[owner->text.size() + 1];
+        std::memcpy(copy, owner->text.c_str(), owner->text.size() + 1);
         if (isCopy) *isCopy = JNI_TRUE;
-        return owner ? jni.lease(jni.mUtfChars, owner, owner->text.c_str(), owner->text.size() + 1, "")
-                     : jni.lease<char>(jni.mUtfChars, nullptr, nullptr, 0, "GetStringUTFChars of no string");
+        return jni.mUtfChars[copy] = owner, copy;
     };
     mTable.ReleaseStringUTFChars = [](JNIEnv* env, jstring string, const char* chars) {
-        FakeJni& jni = self(env);
-        if (jni.giveBack(jni.mUtfChars, chars, jni.find(string, kString), "ReleaseStringUTFChars")) delete[] chars;
+        if (self(env).giveBack(self(env).mUtfChars, chars, string, "ReleaseStringUTFChars")) delete[] chars;
     };
     mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean* isCopy) -> jint* {
         FakeJni& jni = self(env);
         Object* owner = jni.find(array, kIntArray);
+        if (!owner) return jni.mMisuses.push_back("GetIntArrayElements of no int array"), nullptr;
+        jint* copy = new jint[owner->ints.size() + 1];  // never empty: each lease is a distinct pointer
+        std::copy(owner->ints.begin(), owner->ints.end(), copy);
         if (isCopy) *isCopy = JNI_TRUE;
-        return owner ? jni.lease(jni.mElements, owner, owner->ints.data(), owner->ints.size(), "")
-                     : jni.lease<jint>(jni.mElements, nullptr, nullptr, 0, "GetIntArrayElements of no int array");
+        return jni.mElements[copy] = owner, copy;
     };
+    // Mode 0 writes back and releases, JNI_COMMIT only writes back, JNI_ABORT only releases.
     mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray array, jint* elements, jint mode) {
         FakeJni& jni = self(env);
-        Object* owner = jni.find(array, kIntArray);
-        auto held = std::find_if(jni.mElements.begin(), jni.mElements.end(),
-                                 [&](const Lease& l) { return l.pointer == elements && l.owner == owner; });
-        if (held != jni.mElements.end() && mode != JNI_ABORT)
-            std::copy(elements, elements + owner->ints.size(), owner->ints.begin());
-        if (mode != JNI_COMMIT && jni.giveBack(jni.mElements, elements, owner, "ReleaseIntArrayElements"))
+        auto held = jni.mElements.find(elements);
+        if (held != jni.mElements.end() && held->second == static_cast<void*>(array) && mode != JNI_ABORT)
+            std::copy(elements, elements + held->second->ints.size(), held->second->ints.begin());
+        if (mode != JNI_COMMIT && jni.giveBack(jni.mElements, elements, array, "ReleaseIntArrayElements"))
             delete[] elements;
     };
     mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(kClass, name)); };
@@ -54,10 +49,7 @@ FakeJni::FakeJni() {
     mTable.NewObjectArray = [](JNIEnv* env, jsize length, jclass type, jobject initial) -> jobjectArray {
         FakeJni& jni = self(env);
         Object* found = jni.find(type, kClass);
-        if (!found || length < 0) {
-            jni.mMisuses.push_back("NewObjectArray without a class or with a negative length");
-            return nullptr;
-        }
+        if (!found || length < 0) return jni.mMisuses.push_back("NewObjectArray of no class"), nullptr;
         Object* array = jni.make(kObjectArray, found->text);
         array->objects.assign(std::size_t(length), jni.find(initial, kString));
         return reinterpret_cast<jobjectArray>(array);
@@ -66,16 +58,15 @@ FakeJni::FakeJni() {
         FakeJni& jni = self(env);
         Object* found = jni.find(array, kObjectArray);
         if (!found || index < 0 || std::size_t(index) >= found->objects.size())
-            jni.mMisuses.push_back("SetObjectArrayElement outside the array");
-        else
-            found->objects[std::size_t(index)] = jni.find(value, kString);
+            return jni.mMisuses.push_back("SetObjectArrayElement outside the array");
+        found->objects[std::size_t(index)] = jni.find(value, kString);
     };
     mEnv.functions = &mTable;
 }
 
 FakeJni::~FakeJni() {
-    for (const Lease& lease : mUtfChars) delete[] static_cast<const char*>(lease.pointer);
-    for (const Lease& lease : mElements) delete[] static_cast<const jint*>(lease.pointer);
+    for (const auto& lease : mUtfChars) delete[] static_cast<const char*>(lease.first);
+    for (const auto& lease : mElements) delete[] static_cast<const jint*>(lease.first);
 }
 
 FakeJni::Object* FakeJni::make(int kind, const std::string& text) {
@@ -89,10 +80,18 @@ FakeJni::Object* FakeJni::find(const void* handle, int kind) const {
     return nullptr;
 }
 
+bool FakeJni::giveBack(std::map<const void*, Object*>& leases, const void* copy, const void* owner, const char* what) {
+    auto held = leases.find(copy);
+    if (held == leases.end() || held->second != owner)
+        return mMisuses.push_back(std::string(what) + " of something not handed out for that object"), false;
+    leases.erase(held);
+    return true;
+}
+
 jstring FakeJni::string(const std::string& text) { return reinterpret_cast<jstring>(make(kString, text)); }
 
 jintArray FakeJni::intArray(const std::vector<jint>& values) {
-    Object* array = make(kIntArray);
+    Object* array = make(kIntArray, "");
     array->ints = values;
     return reinterpret_cast<jintArray>(array);
 }
@@ -101,36 +100,9 @@ bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& va
     Object* found = find(array, kObjectArray);
     if (!found || found->text != "java/lang/String") return false;
     values.clear();
-    for (Object* element : found->objects) {
-        if (!element) return false;
-        values.push_back(element->text);
-    }
-    return true;
-}
-
-// A copy of `count` items (at least one, so that an empty array still gets a
-// distinct lease); without an owner, a misuse and null.
-template <typename T>
-T* FakeJni::lease(std::vector<Lease>& leases, Object* owner, const T* from, std::size_t count, const char* what) {
-    if (!owner) {
-        mMisuses.push_back(what);
-        return nullptr;
-    }
-    T* copy = new T[std::max<std::size_t>(count, 1)];
-    std::copy(from, from + count, copy);
-    leases.push_back(Lease{copy, owner});
-    return copy;
-}
-
-bool FakeJni::giveBack(std::vector<Lease>& leases, const void* pointer, Object* owner, const char* what) {
-    auto held = std::find_if(leases.begin(), leases.end(),
-                             [&](const Lease& l) { return l.pointer == pointer && l.owner == owner; });
-    if (held == leases.end()) {
-        mMisuses.push_back(std::string(what) + " of something not handed out for that object");
-        return false;
-    }
-    leases.erase(held);
-    return true;
+    for (Object* element : found->objects)
+        if (element) values.push_back(element->text);
+    return values.size() == found->objects.size();
 }
 
 // Objects with elements still handed out stay, so that a late release finds
@@ -139,7 +111,7 @@ void FakeJni::reset() {
     mObjects.erase(std::remove_if(mObjects.begin(), mObjects.end(),
                                   [this](const std::unique_ptr<Object>& owned) {
                                       return std::none_of(mElements.begin(), mElements.end(),
-                                                          [&](const Lease& l) { return l.owner == owned.get(); });
+                                                          [&](const auto& l) { return l.second == owned.get(); });
                                   }),
                    mObjects.end());
 }

@@ -12,6 +12,7 @@
 
 #include <jni.h>
 
+#include <map>
 #include <memory>
 #include <string>
 #include <vector>
@@ -51,7 +52,6 @@ public:
 
     JNIEnv* env() { return &mEnv; }
     jobject thiz() { return reinterpret_cast<jobject>(this); }
-
     // Java-side values, alive until reset().
     jstring string(const std::string& text);
     jintArray intArray(const std::vector<jint>& values);
@@ -69,25 +69,23 @@ public:
     // Ends the "native call": local references die.
     void reset();
 
-    struct Object;
+    struct Object {
+        int kind;
+        std::string text;              // a string; a class's or an object array's element class name
+        std::vector<jint> ints;        // an int array
+        std::vector<Object*> objects;  // an object array
+    };
 
 private:
-    struct Lease {
-        const void* pointer;
-        Object* owner;
-    };
     static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
-    Object* make(int kind, const std::string& text = {});
+    Object* make(int kind, const std::string& text);
     Object* find(const void* handle, int kind) const;
-    template <typename T>
-    T* lease(std::vector<Lease>& leases, Object* owner, const T* from, std::size_t count, const char* what);
-    bool giveBack(std::vector<Lease>& leases, const void* pointer, Object* owner, const char* what);
+    bool giveBack(std::map<const void*, Object*>& leases, const void* copy, const void* owner, const char* what);
 
     JNINativeInterface_ mTable;
     JNIEnv mEnv;
     std::vector<std::unique_ptr<Object>> mObjects;
-    std::vector<Lease> mUtfChars;
-    std::vector<Lease> mElements;
+    std::map<const void*, Object*> mUtfChars, mElements;  // copies handed out, and whose
     std::vector<std::string> mMisuses;
 };
 
