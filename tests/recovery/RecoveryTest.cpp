@@ -43,28 +43,22 @@ protected:
         ASSERT_TRUE(Renderer::mAllRenderers.empty() && Texture::mAllTextures.empty()) << "left by a test";
         context.reset(new vitest::GlContext(kSize, kSize));
         const char* names[] = {"sky"};
-        testSceneReset();
-        testSceneSetNames(names, 1);
-        testSceneSetPicture(1);
+        testSceneReset(), testSceneSetNames(names, 1), testSceneSetPicture(1), testSceneSetDrawResult(7);
         testSceneSetClearColour(1, 0.0f, 0.0f, 0.0f, 1.0f);
-        testSceneSetDrawResult(7);
         gCreateScene = createScene;
         load("sky", {jint(0xFFD02010), jint(0xFF20C030), jint(0xFF3040B0), jint(0x80E0E0E0)}, 2, 2);
         load("sea", {1, 2}, 1, 2);
-        Application::handleStart(0, 0, kSize, kSize);
-        Application::handleInitEffect();
+        Application::handleStart(0, 0, kSize, kSize), Application::handleInitEffect();
         reference = frame();
         EXPECT_NE(reference, Frame(kSize * kSize, 0x000000FFu)) << "the picture shows";
     }
     void TearDown() override {
-        context->makeCurrent();
-        Application::handleStop();
+        context->makeCurrent(), Application::handleStop();
         for (auto& filed : ApplicationVar::msTexturesMap)
             if (std::count(Texture::mAllTextures.begin(), Texture::mAllTextures.end(), filed.second)) delete filed.second;
         ApplicationVar::msTexturesMap.clear();
         EXPECT_EQ(jni.misuses(), Names{});
         EXPECT_EQ(0, jni.outstandingUtfChars() + jni.outstandingElements()) << "JNI copies not released";
-        context.reset();
     }
 
     // The host's call: a name and its pixels (none: an unload).
@@ -91,46 +85,41 @@ protected:
 
 }  // namespace
 
+// In the first frame in another context the order is the behaviour: every
+// name is forgotten, the renderers are made again in registry order, then the
+// textures, all before the scene's first call, without asking a probe; the
+// next frame only asks the two probes.
 TEST_F(Recovery, FrameStaysTheSameThroughManyContextsRestartsAndFramesWithoutOne) {
+    const std::vector<std::string> made = {"glCreateProgram", "glIsProgram", "glGenBuffers", "glGenTextures",
+                                           "glIsTexture", "glClear"};
     for (int round = 0; round < 15; ++round) {
         SCOPED_TRACE(round);
         switch (round % 5) {
         case 0: context->makeSecondCurrent(); break;
         case 1: context->recreate(); break;
-        case 2:
-            // Without a context the frame only forgets every name; nothing can be made.
+        case 2:  // without a context a frame only forgets every name: nothing can be made
             vitest::GlContext::releaseCurrent();
             Application::handleDraw();
-            for (Renderer* renderer : Renderer::mAllRenderers) EXPECT_EQ(0u, renderer->program->program);
-            for (Texture* texture : Texture::mAllTextures) EXPECT_EQ(0u, texture->mId);
             context->makeCurrent();
             break;
-        case 3:
-            // A start in another context only forgets; the first ready frame makes again.
-            context->makeSecondCurrent();
-            Application::handleRestart();
-            for (Renderer* renderer : Renderer::mAllRenderers) EXPECT_EQ(0u, renderer->program->program);
+        case 3:  // a start in another context only forgets; the first ready frame makes again
+            context->makeSecondCurrent(), Application::handleRestart();
             break;
         case 4: context->makeCurrent(); break;
         }
-        ASSERT_EQ(reference, frame());
-        ASSERT_TRUE(allProgramsValid());
-    }
-}
-
-// The order is the behaviour: renderers and textures forget their names, then
-// the renderers are made again in registry order, then the textures, all
-// before the scene's first call, and without asking a probe once the context
-// is known to have changed.
-TEST_F(Recovery, ChangedContextRebuildsRenderersThenTexturesBeforeTheSceneOnce) {
-    context->makeSecondCurrent();
-    for (int pass = 0; pass < 2; ++pass) {
+        const bool forgotten = round % 5 == 2 || round % 5 == 3;  // every name, and nothing made yet
+        for (Renderer* renderer : Renderer::mAllRenderers) EXPECT_TRUE(!forgotten || !renderer->program->program);
+        for (Texture* texture : Texture::mAllTextures) EXPECT_TRUE(!forgotten || !texture->mId);
         GlRecording recording;
-        EXPECT_EQ(reference, frame());
-        EXPECT_EQ(GlRecorder::names({"glCreateProgram", "glIsProgram", "glGenBuffers", "glGenTextures", "glIsTexture",
-                                     "glClear"}),
-                  pass ? (Names{"glIsProgram", "glIsTexture", "glClear"})
-                       : (Names{"glCreateProgram", "glGenBuffers", "glGenTextures", "glGenTextures", "glClear"}));
+        ASSERT_EQ(reference, frame());
+        if (round == 0) {
+            EXPECT_EQ(GlRecorder::names(made),
+                      (Names{"glCreateProgram", "glGenBuffers", "glGenTextures", "glGenTextures", "glClear"}));
+        }
+        ASSERT_TRUE(allProgramsValid());
+        GlRecorder::clear();
+        ASSERT_EQ(reference, frame());
+        EXPECT_EQ(GlRecorder::names(made), (Names{"glIsProgram", "glIsTexture", "glClear"}));
     }
 }
 
@@ -140,18 +129,15 @@ TEST_F(Recovery, ChangedContextRebuildsRenderersThenTexturesBeforeTheSceneOnce) 
 TEST_F(Recovery, ObjectsGoneUnderTheSameContextHandleAreNoticed) {
     for (int gone = 0; gone < 2; ++gone) {
         SCOPED_TRACE(gone ? "texture" : "program");
-        {
-            GlRecording recording;
-            frame();
-            EXPECT_EQ(Renderer::mAllRenderers.front()->program->program, GlRecorder::callsNamed("glIsProgram").at(0).args[0]);
-            EXPECT_EQ(Texture::mAllTextures.front()->mId, GlRecorder::callsNamed("glIsTexture").at(0).args[0]);
-        }
-        if (gone) glDeleteTextures(1, &Texture::mAllTextures.front()->mId);
-        else glUseProgram(0), glDeleteProgram(Renderer::mAllRenderers.front()->program->program);  // not in use: gone at once
         GlRecording recording;
+        frame();
+        EXPECT_EQ(Renderer::mAllRenderers.front()->program->program, GlRecorder::callsNamed("glIsProgram").at(0).args[0]);
+        EXPECT_EQ(Texture::mAllTextures.front()->mId, GlRecorder::callsNamed("glIsTexture").at(0).args[0]);
+        if (gone) glDeleteTextures(1, &Texture::mAllTextures.front()->mId);
+        else glUseProgram(0), glDeleteProgram(Renderer::mAllRenderers.front()->program->program);  // gone at once
+        GlRecorder::clear();
         EXPECT_EQ(reference, frame());
-        EXPECT_EQ(GlRecorder::count("glGenTextures"), 2);
-        EXPECT_TRUE(allProgramsValid());
+        EXPECT_TRUE(GlRecorder::count("glGenTextures") == 2 && allProgramsValid());
     }
 }
 
@@ -159,19 +145,14 @@ TEST_F(Recovery, ObjectsGoneUnderTheSameContextHandleAreNoticed) {
 // as storage of undefined contents (and the scene leaves the picture out).
 TEST_F(Recovery, RecycledStaticTexturesComeBackAfterALoss) {
     const double sky = double(reinterpret_cast<std::uintptr_t>(ApplicationVar::msTexturesMap["sky"]->mBuffer));
-    {
-        GlRecording recording;
-        Application::handleRecycleTextures();
-        ASSERT_EQ(2u, GlRecorder::callsNamed("free").size());
-        EXPECT_EQ(sky, GlRecorder::callsNamed("free")[0].args[0]);
-    }
-    context->makeSecondCurrent();
     GlRecording recording;
-    frame();
+    Application::handleRecycleTextures();
+    EXPECT_EQ(2u, GlRecorder::callsNamed("free").size());
+    EXPECT_EQ(sky, GlRecorder::callsNamed("free").at(0).args[0]);
+    context->makeSecondCurrent(), frame();
     int nullUploads = 0;
     for (const vitest::GlCall& call : GlRecorder::callsNamed("glTexImage2D")) nullUploads += call.args.back() == 0.0;
-    EXPECT_EQ(2, nullUploads);
-    EXPECT_TRUE(allProgramsValid());
+    EXPECT_TRUE(nullUploads == 2 && allProgramsValid());
 }
 
 // Replacing frees the old pixels and uploads the new ones at the new size
@@ -181,16 +162,14 @@ TEST_F(Recovery, ReplacingAHostImageFreesUploadsAtTheNewSizeAndTellsTheSceneWith
     Texture* sky = ApplicationVar::msTexturesMap["sky"];
     const double firstBuffer = double(reinterpret_cast<std::uintptr_t>(sky->mBuffer));
     testSceneClearEvents();
-    {
-        GlRecording recording;
-        pthread_mutex_lock(&ApplicationVar::msCriticalSection);
-        EXPECT_EQ(sky, load("sky", std::vector<jint>(6, jint(0xFF102030u)), 3, 2));
-        pthread_mutex_unlock(&ApplicationVar::msCriticalSection);
-        EXPECT_EQ(GlRecorder::names({"free", "glTexImage2D"}), (Names{"free", "glTexImage2D"}));
-        EXPECT_EQ(firstBuffer, GlRecorder::callsNamed("free")[0].args[0]);
-        const std::vector<double> upload = GlRecorder::callsNamed("glTexImage2D")[0].args;
-        EXPECT_EQ((std::vector<double>{3, 2}), std::vector<double>(upload.begin() + 3, upload.begin() + 5));
-    }
+    GlRecording recording;
+    pthread_mutex_lock(&ApplicationVar::msCriticalSection);
+    EXPECT_EQ(sky, load("sky", std::vector<jint>(6, jint(0xFF102030u)), 3, 2));
+    pthread_mutex_unlock(&ApplicationVar::msCriticalSection);
+    EXPECT_EQ(GlRecorder::names({"free", "glTexImage2D"}), (Names{"free", "glTexImage2D"}));
+    EXPECT_EQ(firstBuffer, GlRecorder::callsNamed("free")[0].args[0]);
+    const std::vector<double> upload = GlRecorder::callsNamed("glTexImage2D")[0].args;
+    EXPECT_TRUE(upload[3] == 3 && upload[4] == 2) << upload[3] << " x " << upload[4];
     EXPECT_EQ(1, testSceneCount(TestSceneTextureUpdated));
     EXPECT_EQ(glm::vec2(1.0f / 3.0f, 0.5f), sky->mTexelSize);
     EXPECT_EQ(Frame(kSize * kSize, 0x102030FFu), frame());
@@ -198,24 +177,18 @@ TEST_F(Recovery, ReplacingAHostImageFreesUploadsAtTheNewSizeAndTellsTheSceneWith
 
 // A second load before anything allocated the image: the upload had no
 // texture of its own, so the first allocation defines the storage in full.
-TEST_F(Recovery, HostImageReplacedBeforeItsFirstAllocationIsUploadedInFull) {
+// Unloading a name never loaded files a null entry that a later load fills;
+// unloading a loaded one deletes the texture and leaves the stale pointer.
+TEST_F(Recovery, HostImagesReplacedBeforeTheirFirstAllocationOrUnloaded) {
     load("early", {jint(0xFF0000FFu)}, 1, 1);
     Texture* early = load("early", {1, 2, 3, 4}, 2, 2);
     GlRecording recording;
     early->allocate();
-    ASSERT_EQ(1u, GlRecorder::callsNamed("glTexImage2D").size());
-    EXPECT_EQ(0, GlRecorder::count("glTexSubImage2D"));
-    EXPECT_EQ(2, GlRecorder::callsNamed("glTexImage2D")[0].args[3]);
-}
-
-// Unloading a name never loaded files a null entry that a later load fills;
-// unloading a loaded one deletes the texture and leaves the stale pointer.
-TEST_F(Recovery, UnloadingAHostImageDeletesItsTextureAndKeepsThePointer) {
-    EXPECT_EQ(nullptr, load("later", {}, 4, 4));
-    EXPECT_EQ(1u, ApplicationVar::msTexturesMap.count("later"));
+    EXPECT_EQ(GlRecorder::names({"glTexImage2D", "glTexSubImage2D"}), Names{"glTexImage2D"});
+    EXPECT_EQ(2, GlRecorder::callsNamed("glTexImage2D").at(0).args[3]);
+    EXPECT_TRUE(load("later", {}, 4, 4) == nullptr && ApplicationVar::msTexturesMap.count("later") == 1);
     Texture* later = load("later", {7}, 1, 1);
-    ASSERT_NE(nullptr, later);
-    EXPECT_EQ(later, load("later", {}, 1, 1));
+    EXPECT_TRUE(later && load("later", {}, 1, 1) == later);
     EXPECT_EQ(0, std::count(Texture::mAllTextures.begin(), Texture::mAllTextures.end(), later));
 }
 

@@ -22,32 +22,18 @@ struct Config {
     int drawResult = 0;
     bool clear = false, picture = false;
     float clearColour[4] = {};
-};
-
-Config gConfig;
+} gConfig;
 std::vector<TestSceneEvent> gEvents;
-int gCounts[TestSceneEventKindCount];
 int gSerial = 0;
-void* gLastMaps[2] = {};
 std::atomic<bool> gInside(false);
 std::atomic<int> gOverlaps(0);
-
-// Marks the time spent inside a scene. Gives up the processor once inside, so
-// that a call let in without the lock finds the flag set.
-struct Inside {
-    Inside() {
-        if (gInside.exchange(true)) ++gOverlaps;
-        std::this_thread::yield();
-    }
-    ~Inside() { gInside.store(false); }
-};
 
 class RecordingScene : public vi::Scene {
 public:
     RecordingScene(const int* size, vi::TexturesMap* textures, int factory)
         : vi::Scene(size), mSerial(++gSerial), mFactory(factory), mTextures(textures) {
         mNames = gConfig.names;
-        record(TestSceneCreated, size[0], size[1]);
+        note(TestSceneCreated, size[0], size[1]);
     }
     ~RecordingScene() override {
         note(TestSceneDestroyed);
@@ -73,22 +59,21 @@ public:
         // filed, so that its GL names come from a frame the runtime checked
         // the context for; left out while the image has no client pixels
         // (recycled, it may come back from a lost context undefined).
-        if (gConfig.picture && !mPicture && !mNames.empty() && eglGetCurrentContext() != EGL_NO_CONTEXT) {
-            auto filed = mTextures->find(mNames[0]);
-            if (filed != mTextures->end() && filed->second) mPicture = new vi::Background(*filed->second);
-        }
+        auto filed = mNames.empty() ? mTextures->end() : mTextures->find(mNames[0]);
+        if (gConfig.picture && !mPicture && filed != mTextures->end() && filed->second && eglGetCurrentContext())
+            mPicture = new vi::Background(*filed->second);
         if (gConfig.picture && mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
         return gConfig.drawResult;
     }
 
 private:
+    // Gives up the processor once inside, so that a call let in without the
+    // lock finds the flag set.
     void note(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
-        Inside inside;
-        record(kind, a, b, x, y);
-    }
-    void record(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
+        if (gInside.exchange(true)) ++gOverlaps;
+        std::this_thread::yield();
         gEvents.push_back({kind, mSerial, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});
-        ++gCounts[kind];
+        gInside.store(false);
     }
 
     int mSerial, mFactory;
@@ -96,52 +81,32 @@ private:
     vi::Background* mPicture = nullptr;
 };
 
-vi::Scene* create(int* size, vi::ModelsMap* models, vi::TexturesMap* textures, int factory) {
-    Inside inside;
-    gLastMaps[0] = models;
-    gLastMaps[1] = textures;
-    return new RecordingScene(size, textures, factory);
-}
-
 }  // namespace
 
 extern "C" {
 
-TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures) {
-    return create(size, models, textures, 1);
+TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
+    return new RecordingScene(size, textures, 1);
 }
 // Not looked up by the runtime: a test puts it into vi::gCreateScene to tell
 // which factory made a scene.
-TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures) {
-    return create(size, models, textures, 2);
+TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
+    return new RecordingScene(size, textures, 2);
 }
 
-void testSceneClearEvents(void) {
-    gEvents.clear();
-    std::fill(gCounts, gCounts + TestSceneEventKindCount, 0);
-    gOverlaps = 0;
-}
-void testSceneReset(void) {
-    testSceneClearEvents();
-    gConfig = Config();
-    gSerial = 0;
-    gLastMaps[0] = gLastMaps[1] = nullptr;
-}
+void testSceneClearEvents(void) { gEvents.clear(), gOverlaps = 0; }
+void testSceneReset(void) { testSceneClearEvents(), gConfig = Config(), gSerial = 0; }
 void testSceneSetNames(const char* const* names, int count) { gConfig.names.assign(names, names + count); }
 void testSceneSetDrawResult(int result) { gConfig.drawResult = result; }
 void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha) {
     gConfig = {gConfig.names, gConfig.drawResult, enabled != 0, gConfig.picture, {red, green, blue, alpha}};
 }
 void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
-
 int testSceneEventCount(void) { return int(gEvents.size()); }
-TestSceneEvent testSceneEventAt(int index) {
-    if (index >= 0 && std::size_t(index) < gEvents.size()) return gEvents[std::size_t(index)];
-    return TestSceneEvent{-1, 0, 0, 0, 0, 0.0f, 0.0f, 0, 0.0f};
+TestSceneEvent testSceneEventAt(int index) { return gEvents.at(std::size_t(index)); }
+int testSceneCount(int kind) {
+    return int(std::count_if(gEvents.begin(), gEvents.end(), [kind](const TestSceneEvent& e) { return e.kind == kind; }));
 }
-int testSceneCount(int kind) { return gCounts[kind]; }
 int testSceneOverlaps(void) { return gOverlaps; }
-void* testSceneLastModelsMap(void) { return gLastMaps[0]; }
-void* testSceneLastTexturesMap(void) { return gLastMaps[1]; }
 
 }  // extern "C"

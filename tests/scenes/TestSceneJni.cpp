@@ -19,8 +19,7 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(reset)(JNIEnv*, jclass) { testSceneReset
 
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectArray names) {
     std::vector<std::string> copies;
-    const jsize count = env->GetArrayLength(names);
-    for (jsize i = 0; i < count; ++i) {
+    for (jsize i = 0; i < env->GetArrayLength(names); ++i) {
         jstring name = static_cast<jstring>(env->GetObjectArrayElement(names, i));
         const char* chars = env->GetStringUTFChars(name, nullptr);
         copies.push_back(chars);
@@ -53,9 +52,8 @@ JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) { ret
 JNIEXPORT jintArray JNICALL TESTSCENE_NATIVE(eventInts)(JNIEnv* env, jclass, jint index) {
     const TestSceneEvent e = testSceneEventAt(index);
     const jint values[] = {e.kind, e.scene, e.factory, e.a, e.b};
-    const jsize count = jsize(sizeof(values) / sizeof(values[0]));
-    jintArray array = env->NewIntArray(count);
-    env->SetIntArrayRegion(array, 0, count, values);
+    jintArray array = env->NewIntArray(5);
+    env->SetIntArrayRegion(array, 0, 5, values);
     return array;
 }
 

@@ -44,13 +44,11 @@ TESTSCENE_API void testSceneSetClearColour(int enabled, float red, float green, 
 TESTSCENE_API void testSceneSetPicture(int enabled);
 
 TESTSCENE_API int testSceneEventCount(void);
+// index from 0 to testSceneEventCount() - 1
 TESTSCENE_API struct TestSceneEvent testSceneEventAt(int index);
 TESTSCENE_API int testSceneCount(int kind);
 // Calls that began while another call into a scene was still running.
 TESTSCENE_API int testSceneOverlaps(void);
-// The map pointers the last factory call received.
-TESTSCENE_API void* testSceneLastModelsMap(void);
-TESTSCENE_API void* testSceneLastTexturesMap(void);
 
 #ifdef __cplusplus
 }

@@ -5,35 +5,27 @@
 
 namespace vitest {
 
-namespace {
-
-enum Kind { kString, kIntArray, kObjectArray, kClass };
-
-}  // namespace
-
 FakeJni::FakeJni() {
     std::memset(&mTable, 0, sizeof(mTable));
     mTable.reserved0 = this;
     mTable.GetStringUTFChars = [](JNIEnv* env, jstring string, jboolean* isCopy) -> const char* {
-        FakeJni& jni = self(env);
-        Object* owner = jni.find(string, kString);
-        if (!owner) return jni.mMisuses.push_back("GetStringUTFChars of no string"), nullptr;
+        Object* owner = self(env).find(string);
+        if (!owner) return self(env).mMisuses.push_back("GetStringUTFChars of no string"), nullptr;
         char* copy = new char[owner->text.size() + 1];
         std::memcpy(copy, owner->text.c_str(), owner->text.size() + 1);
         if (isCopy) *isCopy = JNI_TRUE;
-        return jni.mUtfChars[copy] = owner, copy;
+        return self(env).mUtfChars[copy] = owner, copy;
     };
     mTable.ReleaseStringUTFChars = [](JNIEnv* env, jstring string, const char* chars) {
         if (self(env).giveBack(self(env).mUtfChars, chars, string, "ReleaseStringUTFChars")) delete[] chars;
     };
     mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean* isCopy) -> jint* {
-        FakeJni& jni = self(env);
-        Object* owner = jni.find(array, kIntArray);
-        if (!owner) return jni.mMisuses.push_back("GetIntArrayElements of no int array"), nullptr;
+        Object* owner = self(env).find(array);
+        if (!owner) return self(env).mMisuses.push_back("GetIntArrayElements of no int array"), nullptr;
         jint* copy = new jint[owner->ints.size() + 1];  // never empty: each lease is a distinct pointer
         std::copy(owner->ints.begin(), owner->ints.end(), copy);
         if (isCopy) *isCopy = JNI_TRUE;
-        return jni.mElements[copy] = owner, copy;
+        return self(env).mElements[copy] = owner, copy;
     };
     // Mode 0 writes back and releases, JNI_COMMIT only writes back, JNI_ABORT only releases.
     mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray array, jint* elements, jint mode) {
@@ -44,22 +36,20 @@ FakeJni::FakeJni() {
         if (mode != JNI_COMMIT && jni.giveBack(jni.mElements, elements, array, "ReleaseIntArrayElements"))
             delete[] elements;
     };
-    mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(kClass, name)); };
+    mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(name)); };
     mTable.NewStringUTF = [](JNIEnv* env, const char* chars) { return self(env).string(chars); };
     mTable.NewObjectArray = [](JNIEnv* env, jsize length, jclass type, jobject initial) -> jobjectArray {
-        FakeJni& jni = self(env);
-        Object* found = jni.find(type, kClass);
-        if (!found || length < 0) return jni.mMisuses.push_back("NewObjectArray of no class"), nullptr;
-        Object* array = jni.make(kObjectArray, found->text);
-        array->objects.assign(std::size_t(length), jni.find(initial, kString));
+        Object* found = self(env).find(type);
+        if (!found || length < 0) return self(env).mMisuses.push_back("NewObjectArray of no class"), nullptr;
+        Object* array = self(env).make(found->text);
+        array->objects.assign(std::size_t(length), self(env).find(initial));
         return reinterpret_cast<jobjectArray>(array);
     };
     mTable.SetObjectArrayElement = [](JNIEnv* env, jobjectArray array, jsize index, jobject value) {
-        FakeJni& jni = self(env);
-        Object* found = jni.find(array, kObjectArray);
+        Object* found = self(env).find(array);
         if (!found || index < 0 || std::size_t(index) >= found->objects.size())
-            return jni.mMisuses.push_back("SetObjectArrayElement outside the array");
-        found->objects[std::size_t(index)] = jni.find(value, kString);
+            return self(env).mMisuses.push_back("SetObjectArrayElement outside the array");
+        found->objects[std::size_t(index)] = self(env).find(value);
     };
     mEnv.functions = &mTable;
 }
@@ -69,14 +59,14 @@ FakeJni::~FakeJni() {
     for (const auto& lease : mElements) delete[] static_cast<const jint*>(lease.first);
 }
 
-FakeJni::Object* FakeJni::make(int kind, const std::string& text) {
-    mObjects.emplace_back(new Object{kind, text, {}, {}});
+FakeJni::Object* FakeJni::make(const std::string& text) {
+    mObjects.emplace_back(new Object{text, {}, {}});
     return mObjects.back().get();
 }
 
-FakeJni::Object* FakeJni::find(const void* handle, int kind) const {
+FakeJni::Object* FakeJni::find(const void* handle) const {
     for (const std::unique_ptr<Object>& owned : mObjects)
-        if (owned.get() == handle && owned->kind == kind) return owned.get();
+        if (owned.get() == handle) return owned.get();
     return nullptr;
 }
 
@@ -88,16 +78,16 @@ bool FakeJni::giveBack(std::map<const void*, Object*>& leases, const void* copy,
     return true;
 }
 
-jstring FakeJni::string(const std::string& text) { return reinterpret_cast<jstring>(make(kString, text)); }
+jstring FakeJni::string(const std::string& text) { return reinterpret_cast<jstring>(make(text)); }
 
 jintArray FakeJni::intArray(const std::vector<jint>& values) {
-    Object* array = make(kIntArray, "");
+    Object* array = make("");
     array->ints = values;
     return reinterpret_cast<jintArray>(array);
 }
 
 bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& values) const {
-    Object* found = find(array, kObjectArray);
+    Object* found = find(array);
     if (!found || found->text != "java/lang/String") return false;
     values.clear();
     for (Object* element : found->objects)

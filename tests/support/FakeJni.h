@@ -19,23 +19,18 @@
 
 #define VI_NATIVE(method) Java_com_tarq_android_visualeffect_common_Native_##method
 
-// The runtime's entry points of com.tarq.android.visualeffect.common.Native.
+// The runtime's entry points of com.tarq.android.visualeffect.common.Native;
+// most take no argument and answer an int.
+#define VI_NATIVE_PLAIN(method) jint VI_NATIVE(method)(JNIEnv*, jobject);
 extern "C" {
+VI_NATIVE_PLAIN(prehandleInitEffect) VI_NATIVE_PLAIN(prehandleRestart) VI_NATIVE_PLAIN(prehandleStop)
+VI_NATIVE_PLAIN(prehandlePause) VI_NATIVE_PLAIN(prehandleDraw) VI_NATIVE_PLAIN(prehandleMenuPressed)
+VI_NATIVE_PLAIN(prehandleVolumeUpPressed) VI_NATIVE_PLAIN(prehandleVolumeDownPressed)
+VI_NATIVE_PLAIN(prehandleClearEffect) VI_NATIVE_PLAIN(prehandleAffordance) VI_NATIVE_PLAIN(prehandleUnlock)
 jobjectArray VI_NATIVE(prehandleStart)(JNIEnv*, jobject, jstring, jint, jint);
-jint VI_NATIVE(prehandleInitEffect)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleRestart)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleStop)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandlePause)(JNIEnv*, jobject);
 void VI_NATIVE(prehandleRecycleTextures)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleDraw)(JNIEnv*, jobject);
 void VI_NATIVE(prehandleTouch)(JNIEnv*, jobject, jint, jint, jint);
-jint VI_NATIVE(prehandleMenuPressed)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleVolumeUpPressed)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleVolumeDownPressed)(JNIEnv*, jobject);
 jint VI_NATIVE(prehandleParam)(JNIEnv*, jobject, jint, jint);
-jint VI_NATIVE(prehandleClearEffect)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleAffordance)(JNIEnv*, jobject);
-jint VI_NATIVE(prehandleUnlock)(JNIEnv*, jobject);
 jint VI_NATIVE(prehandleSetOrientation)(JNIEnv*, jobject, jint);
 void VI_NATIVE(loadModel)(JNIEnv*, jobject, jstring);
 void VI_NATIVE(loadTexture)(JNIEnv*, jclass, jstring, jintArray, jint, jint);
@@ -69,17 +64,16 @@ public:
     // Ends the "native call": local references die.
     void reset();
 
+private:
     struct Object {
-        int kind;
         std::string text;              // a string; a class's or an object array's element class name
         std::vector<jint> ints;        // an int array
         std::vector<Object*> objects;  // an object array
     };
 
-private:
     static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
-    Object* make(int kind, const std::string& text);
-    Object* find(const void* handle, int kind) const;
+    Object* make(const std::string& text);
+    Object* find(const void* handle) const;
     bool giveBack(std::map<const void*, Object*>& leases, const void* copy, const void* owner, const char* what);
 
     JNINativeInterface_ mTable;
