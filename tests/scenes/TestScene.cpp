@@ -1,7 +1,11 @@
 // The recording scene. Every operation notes itself; an atomic flag notices
-// a call that begins while another one is still inside a scene.
+// a call that begins while another one is still inside a scene. Its Java
+// face, the natives of com.tarq.test.TestScene, is found by the JVM because
+// the Java test loads this plug-in with System.load before the runtime opens
+// it (both then share one copy).
 #include <EGL/egl.h>
 #include <GLES2/gl2.h>
+#include <jni.h>
 
 #include <algorithm>
 #include <atomic>
@@ -10,6 +14,7 @@
 #include <vector>
 
 #include "Application/AnimationManager.h"
+#include "Application/ApplicationVar.h"
 #include "Application/Scene.h"
 #include "Render/Background.h"
 #include "Render/Texture.h"
@@ -35,10 +40,7 @@ public:
         mNames = gConfig.names;
         note(TestSceneCreated, size[0], size[1]);
     }
-    ~RecordingScene() override {
-        note(TestSceneDestroyed);
-        delete mPicture;
-    }
+    ~RecordingScene() override { note(TestSceneDestroyed), delete mPicture; }
 
     void clearEffect() override { note(TestSceneClearEffect); }
     void affordance() override { note(TestSceneAffordance); }
@@ -98,8 +100,8 @@ void testSceneClearEvents(void) { gEvents.clear(), gOverlaps = 0; }
 void testSceneReset(void) { testSceneClearEvents(), gConfig = Config(), gSerial = 0; }
 void testSceneSetNames(const char* const* names, int count) { gConfig.names.assign(names, names + count); }
 void testSceneSetDrawResult(int result) { gConfig.drawResult = result; }
-void testSceneSetClearColour(int enabled, float red, float green, float blue, float alpha) {
-    gConfig = {gConfig.names, gConfig.drawResult, enabled != 0, gConfig.picture, {red, green, blue, alpha}};
+void testSceneSetClearColour(int on, float red, float green, float blue, float alpha) {
+    gConfig = {gConfig.names, gConfig.drawResult, on != 0, gConfig.picture, {red, green, blue, alpha}};
 }
 void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
 int testSceneEventCount(void) { return int(gEvents.size()); }
@@ -108,5 +110,44 @@ int testSceneCount(int kind) {
     return int(std::count_if(gEvents.begin(), gEvents.end(), [kind](const TestSceneEvent& e) { return e.kind == kind; }));
 }
 int testSceneOverlaps(void) { return gOverlaps; }
+
+#define TESTSCENE_NATIVE(method) Java_com_tarq_test_TestScene_##method
+
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(reset)(JNIEnv*, jclass) { testSceneReset(); }
+
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectArray names) {
+    gConfig.names.clear();
+    for (jsize i = 0; i < env->GetArrayLength(names); ++i) {
+        jstring name = static_cast<jstring>(env->GetObjectArrayElement(names, i));
+        const char* chars = env->GetStringUTFChars(name, nullptr);
+        gConfig.names.push_back(chars);
+        env->ReleaseStringUTFChars(name, chars);
+        env->DeleteLocalRef(name);
+    }
+}
+
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint result) { gConfig.drawResult = result; }
+
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean enabled, jfloat red, jfloat green,
+                                                         jfloat blue, jfloat alpha) {
+    testSceneSetClearColour(enabled, red, green, blue, alpha);
+}
+
+// Makes the runtime's next start use createSecondScene, as long as it does not
+// look the factory up again.
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(useSecondFactory)(JNIEnv*, jclass) { vi::gCreateScene = createSecondScene; }
+
+JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return testSceneEventCount(); }
+
+JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) { return testSceneCount(kind); }
+
+// kind, scene, factory, a, b
+JNIEXPORT jintArray JNICALL TESTSCENE_NATIVE(eventInts)(JNIEnv* env, jclass, jint index) {
+    const TestSceneEvent& e = gEvents.at(std::size_t(index));
+    const jint values[] = {e.kind, e.scene, e.factory, e.a, e.b};
+    jintArray array = env->NewIntArray(5);
+    env->SetIntArrayRegion(array, 0, 5, values);
+    return array;
+}
 
 }  // extern "C"

@@ -9,25 +9,24 @@
 
 #define TESTSCENE_API __attribute__((visibility("default")))
 
-#ifdef __cplusplus
 extern "C" {
-#endif
 
 enum TestSceneEventKind {
     TestSceneCreated, TestSceneDestroyed, TestSceneClearEffect, TestSceneAffordance, TestSceneUnlock,
-    TestSceneTextureUpdated, TestSceneInitEffect, TestSceneInitEffectAlternate, TestSceneDraw,
-    TestSceneTouchDown, TestSceneTouchUp, TestSceneTouchMove, TestSceneKeyPressed, TestSceneParam,
-    TestSceneEventKindCount
+    TestSceneTextureUpdated, TestSceneInitEffect, TestSceneInitEffectAlternate, TestSceneDraw, TestSceneTouchDown,
+    TestSceneTouchUp, TestSceneTouchMove, TestSceneKeyPressed, TestSceneParam, TestSceneEventKindCount
 };
 
+// scene: the scene's serial number, from 1 after a reset; factory: 1 for
+// createScene, 2 for createSecondScene; a and b: a start's size given to the
+// factory, a parameter's two values, a key's code; x and y: a touch's
+// normalised point; orientation: the scene's during the call; now:
+// vi::AnimationManager::mNow during the call.
 struct TestSceneEvent {
-    int kind;
-    int scene;        // serial number of the scene, from 1 after a reset
-    int factory;      // 1: createScene, 2: createSecondScene
-    int a, b;         // Created: the size given to the factory; Param: a, b; KeyPressed: a is the key
-    float x, y;       // touches: the normalised point
-    int orientation;  // the scene's orientation during the call
-    float now;        // vi::AnimationManager::mNow during the call
+    int kind, scene, factory, a, b;
+    float x, y;
+    int orientation;
+    float now;
 };
 
 // Forgets every event and the overlaps, and restores the defaults: no names,
@@ -49,7 +48,4 @@ TESTSCENE_API struct TestSceneEvent testSceneEventAt(int index);
 TESTSCENE_API int testSceneCount(int kind);
 // Calls that began while another call into a scene was still running.
 TESTSCENE_API int testSceneOverlaps(void);
-
-#ifdef __cplusplus
 }
-#endif

@@ -9,23 +9,13 @@ FakeJni::FakeJni() {
     std::memset(&mTable, 0, sizeof(mTable));
     mTable.reserved0 = this;
     mTable.GetStringUTFChars = [](JNIEnv* env, jstring string, jboolean* isCopy) -> const char* {
-        Object* owner = self(env).find(string);
-        if (!owner) return self(env).mMisuses.push_back("GetStringUTFChars of no string"), nullptr;
-        char* copy = new char[owner->text.size() + 1];
-        std::memcpy(copy, owner->text.c_str(), owner->text.size() + 1);
-        if (isCopy) *isCopy = JNI_TRUE;
-        return self(env).mUtfChars[copy] = owner, copy;
+        return self(env).lend<char>(self(env).mUtfChars, string, &Object::text, isCopy);
     };
     mTable.ReleaseStringUTFChars = [](JNIEnv* env, jstring string, const char* chars) {
         if (self(env).giveBack(self(env).mUtfChars, chars, string, "ReleaseStringUTFChars")) delete[] chars;
     };
-    mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean* isCopy) -> jint* {
-        Object* owner = self(env).find(array);
-        if (!owner) return self(env).mMisuses.push_back("GetIntArrayElements of no int array"), nullptr;
-        jint* copy = new jint[owner->ints.size() + 1];  // never empty: each lease is a distinct pointer
-        std::copy(owner->ints.begin(), owner->ints.end(), copy);
-        if (isCopy) *isCopy = JNI_TRUE;
-        return self(env).mElements[copy] = owner, copy;
+    mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean* isCopy) {
+        return self(env).lend<jint>(self(env).mElements, array, &Object::ints, isCopy);
     };
     // Mode 0 writes back and releases, JNI_COMMIT only writes back, JNI_ABORT only releases.
     mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray array, jint* elements, jint mode) {
@@ -36,54 +26,36 @@ FakeJni::FakeJni() {
         if (mode != JNI_COMMIT && jni.giveBack(jni.mElements, elements, array, "ReleaseIntArrayElements"))
             delete[] elements;
     };
-    mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(name)); };
+    mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(name, {})); };
     mTable.NewStringUTF = [](JNIEnv* env, const char* chars) { return self(env).string(chars); };
-    mTable.NewObjectArray = [](JNIEnv* env, jsize length, jclass type, jobject initial) -> jobjectArray {
-        Object* found = self(env).find(type);
-        if (!found || length < 0) return self(env).mMisuses.push_back("NewObjectArray of no class"), nullptr;
-        Object* array = self(env).make(found->text);
+    mTable.NewObjectArray = [](JNIEnv* env, jsize length, jclass type, jobject initial) {
+        Object* array = self(env).make(self(env).find(type)->text, {});
         array->objects.assign(std::size_t(length), self(env).find(initial));
         return reinterpret_cast<jobjectArray>(array);
     };
     mTable.SetObjectArrayElement = [](JNIEnv* env, jobjectArray array, jsize index, jobject value) {
-        Object* found = self(env).find(array);
-        if (!found || index < 0 || std::size_t(index) >= found->objects.size())
-            return self(env).mMisuses.push_back("SetObjectArrayElement outside the array");
-        found->objects[std::size_t(index)] = self(env).find(value);
+        self(env).find(array)->objects.at(std::size_t(index)) = self(env).find(value);
     };
     mEnv.functions = &mTable;
 }
 
-FakeJni::~FakeJni() {
-    for (const auto& lease : mUtfChars) delete[] static_cast<const char*>(lease.first);
-    for (const auto& lease : mElements) delete[] static_cast<const jint*>(lease.first);
+// A copy of the object's items (one more, zeroed: a string's terminator, and
+// never an empty lease), noted as handed out.
+template <typename T, typename Items>
+T* FakeJni::lend(Leases& leases, const void* handle, Items Object::*items, jboolean* isCopy) {
+    const Items& from = find(handle)->*items;
+    T* copy = new T[from.size() + 1]();
+    std::copy(from.begin(), from.end(), copy);
+    if (isCopy) *isCopy = JNI_TRUE;
+    return leases[copy] = find(handle), copy;
 }
 
-FakeJni::Object* FakeJni::make(const std::string& text) {
-    mObjects.emplace_back(new Object{text, {}, {}});
-    return mObjects.back().get();
-}
-
-FakeJni::Object* FakeJni::find(const void* handle) const {
-    for (const std::unique_ptr<Object>& owned : mObjects)
-        if (owned.get() == handle) return owned.get();
-    return nullptr;
-}
-
-bool FakeJni::giveBack(std::map<const void*, Object*>& leases, const void* copy, const void* owner, const char* what) {
+bool FakeJni::giveBack(Leases& leases, const void* copy, const void* owner, const char* what) {
     auto held = leases.find(copy);
     if (held == leases.end() || held->second != owner)
         return mMisuses.push_back(std::string(what) + " of something not handed out for that object"), false;
     leases.erase(held);
     return true;
-}
-
-jstring FakeJni::string(const std::string& text) { return reinterpret_cast<jstring>(make(text)); }
-
-jintArray FakeJni::intArray(const std::vector<jint>& values) {
-    Object* array = make("");
-    array->ints = values;
-    return reinterpret_cast<jintArray>(array);
 }
 
 bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& values) const {

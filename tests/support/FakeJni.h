@@ -41,15 +41,18 @@ namespace vitest {
 class FakeJni {
 public:
     FakeJni();
-    ~FakeJni();
+    ~FakeJni() {
+        for (const auto& lease : mUtfChars) delete[] static_cast<const char*>(lease.first);
+        for (const auto& lease : mElements) delete[] static_cast<const jint*>(lease.first);
+    }
     FakeJni(const FakeJni&) = delete;
     FakeJni& operator=(const FakeJni&) = delete;
 
     JNIEnv* env() { return &mEnv; }
     jobject thiz() { return reinterpret_cast<jobject>(this); }
     // Java-side values, alive until reset().
-    jstring string(const std::string& text);
-    jintArray intArray(const std::vector<jint>& values);
+    jstring string(const std::string& text) { return reinterpret_cast<jstring>(make(text, {})); }
+    jintArray intArray(const std::vector<jint>& values) { return reinterpret_cast<jintArray>(make("", values)); }
     // The elements of a String[] the runtime made, or false if `array` is not one.
     bool stringArrayValues(jobjectArray array, std::vector<std::string>& values) const;
 
@@ -70,16 +73,27 @@ private:
         std::vector<jint> ints;        // an int array
         std::vector<Object*> objects;  // an object array
     };
+    using Leases = std::map<const void*, Object*>;  // copies handed out, and whose
 
     static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
-    Object* make(const std::string& text);
-    Object* find(const void* handle) const;
-    bool giveBack(std::map<const void*, Object*>& leases, const void* copy, const void* owner, const char* what);
+    Object* make(const std::string& text, const std::vector<jint>& ints) {
+        mObjects.emplace_back(new Object{text, ints, {}});
+        return mObjects.back().get();
+    }
+    // Any handle not made here is null: a JNI call on it then crashes at once.
+    Object* find(const void* handle) const {
+        for (const std::unique_ptr<Object>& owned : mObjects)
+            if (owned.get() == handle) return owned.get();
+        return nullptr;
+    }
+    template <typename T, typename Items>
+    T* lend(Leases& leases, const void* handle, Items Object::*items, jboolean* isCopy);
+    bool giveBack(Leases& leases, const void* copy, const void* owner, const char* what);
 
     JNINativeInterface_ mTable;
     JNIEnv mEnv;
     std::vector<std::unique_ptr<Object>> mObjects;
-    std::map<const void*, Object*> mUtfChars, mElements;  // copies handed out, and whose
+    Leases mUtfChars, mElements;
     std::vector<std::string> mMisuses;
 };
 
