@@ -8,7 +8,6 @@
 #include <pthread.h>
 
 #include <cstdint>
-#include <cstring>
 #include <memory>
 
 #include "Application/Application.h"
@@ -29,8 +28,7 @@ extern "C" void __wrap_free(void* p) {
 }
 
 using namespace vi;
-using vitest::GlRecorder;
-using vitest::GlRecording;
+using namespace vitest;
 using Frame = std::vector<std::uint32_t>;
 using Names = std::vector<std::string>;
 
@@ -45,7 +43,6 @@ protected:
         context.reset(new vitest::GlContext(kSize, kSize));
         const char* names[] = {"sky"};
         testSceneReset(), testSceneSetNames(names, 1), testSceneSetPicture(1), testSceneSetDrawResult(7);
-        testSceneSetClearColour(1, 0.0f, 0.0f, 0.0f, 1.0f);
         gCreateScene = createScene;
         load("sky", {jint(0xFFD02010), jint(0xFF20C030), jint(0xFF3040B0), jint(0x80E0E0E0)}, 2, 2);
         load("sea", {1, 2}, 1, 2);
@@ -63,19 +60,12 @@ protected:
 
     // The host's call: a name and its pixels (none: an unload).
     Texture* load(const char* name, std::vector<jint> pixels, int width, int height) {
-        VI_NATIVE(loadTexture)(jni.env(), nullptr, jni.string(name), pixels.empty() ? nullptr : jni.intArray(pixels),
-                               width, height);
-        jni.reset();
-        return ApplicationVar::msTexturesMap[name];
+        VI_NATIVE(loadTexture)(jni.env(), nullptr, jni.string(name), pixels.empty() ? nullptr : jni.intArray(pixels), width, height);
+        return jni.reset(), ApplicationVar::msTexturesMap[name];
     }
     static Frame frame() {
         EXPECT_EQ(7, Application::handleDraw());
-        return vitest::readWords(0, 0, kSize, kSize);
-    }
-    static bool allProgramsValid() {
-        for (Renderer* renderer : Renderer::mAllRenderers)
-            if (glIsProgram(renderer->program->program) != GL_TRUE) return false;
-        return true;
+        return readWords(0, 0, kSize, kSize);
     }
 
     std::unique_ptr<vitest::GlContext> context;
@@ -90,8 +80,8 @@ protected:
 // textures, all before the scene's first call, without asking a probe; the
 // next frame only asks the two probes.
 TEST_F(Recovery, FrameStaysTheSameThroughManyContextsRestartsAndFramesWithoutOne) {
-    const Names made = {"glCreateProgram", "glIsProgram", "glGenBuffers", "glGenTextures", "glIsTexture", "glClear"};
-    const Names firstFrame = {"glCreateProgram", "glGenBuffers", "glGenTextures", "glGenTextures", "glClear"};
+    const Names made = {"glCreateProgram", "glIsProgram", "glGenBuffers", "glGenTextures", "glIsTexture", "glDrawArrays"};
+    const Names firstFrame = {"glCreateProgram", "glGenBuffers", "glGenTextures", "glGenTextures", "glDrawArrays"};
     for (int round = 0; round < 15; ++round) {
         SCOPED_TRACE(round);
         switch (round % 5) {
@@ -109,10 +99,9 @@ TEST_F(Recovery, FrameStaysTheSameThroughManyContextsRestartsAndFramesWithoutOne
         GlRecording recording;
         ASSERT_EQ(reference, frame());
         if (round == 0) { EXPECT_EQ(GlRecorder::names(made), firstFrame); }
-        ASSERT_TRUE(allProgramsValid());
         GlRecorder::clear();
         ASSERT_EQ(reference, frame());
-        EXPECT_EQ(GlRecorder::names(made), (Names{"glIsProgram", "glIsTexture", "glClear"}));
+        EXPECT_EQ(GlRecorder::names(made), (Names{"glIsProgram", "glIsTexture", "glDrawArrays"}));
     }
 }
 
@@ -130,7 +119,7 @@ TEST_F(Recovery, ObjectsGoneUnderTheSameContextHandleAreNoticed) {
         else glUseProgram(0), glDeleteProgram(Renderer::mAllRenderers.front()->program->program);  // gone at once
         GlRecorder::clear();
         EXPECT_EQ(reference, frame());
-        EXPECT_TRUE(GlRecorder::count("glGenTextures") == 2 && allProgramsValid());
+        EXPECT_EQ(GlRecorder::count("glGenTextures"), 2);
     }
 }
 
@@ -144,13 +133,13 @@ TEST_F(Recovery, RecycledStaticTexturesComeBackAfterALoss) {
     context->makeSecondCurrent(), frame();
     int nullUploads = 0;
     for (const vitest::GlCall& call : GlRecorder::callsNamed("glTexImage2D")) nullUploads += call.args.back() == 0.0;
-    EXPECT_TRUE(nullUploads == 2 && allProgramsValid());
+    EXPECT_EQ(nullUploads, 2);
 }
 
 // Replacing frees the old pixels and uploads the new ones at the new size
 // into the same texture, shown at the next frame; the scene is told, and no
 // lock is taken (the test holds it: a replace that took it would never return).
-TEST_F(Recovery, ReplacingAHostImageFreesUploadsAtTheNewSizeAndTellsTheSceneWithoutTheLock) {
+TEST_F(Recovery, HostImagesReplacedEarlyOrLateAndUnloaded) {
     Texture* sky = ApplicationVar::msTexturesMap["sky"];
     const double firstBuffer = address(sky->mBuffer);
     GlRecording recording;
@@ -161,17 +150,14 @@ TEST_F(Recovery, ReplacingAHostImageFreesUploadsAtTheNewSizeAndTellsTheSceneWith
     EXPECT_EQ(firstBuffer, GlRecorder::callsNamed("free")[0].args[0]);
     const std::vector<double> upload = GlRecorder::callsNamed("glTexImage2D")[0].args;
     EXPECT_TRUE(upload[3] == 3 && upload[4] == 2 && sky->mTexelSize == glm::vec2(1.0f / 3.0f, 0.5f));
-    EXPECT_EQ(1, testSceneCount(TestSceneTextureUpdated));
+    EXPECT_EQ(TestSceneTextureUpdated, testSceneEventAt(testSceneEventCount() - 1).kind) << "the scene is told";
     EXPECT_EQ(Frame(kSize * kSize, 0x102030FFu), frame());
-}
-
-// A second load before anything allocated the image: the upload had no
-// texture of its own, so the first allocation defines the storage in full.
-// Unloading a name never loaded files a null entry that a later load fills;
-// unloading a loaded one deletes the texture and leaves the stale pointer.
-TEST_F(Recovery, HostImagesReplacedBeforeTheirFirstAllocationOrUnloaded) {
+    // A second load before anything allocated the image: the upload had no
+    // texture of its own, so the first allocation defines the storage in full.
+    // Unloading a name never loaded files a null entry that a later load fills;
+    // unloading a loaded one deletes the texture and leaves the stale pointer.
+    GlRecorder::clear();
     load("early", {jint(0xFF0000FFu)}, 1, 1);
-    GlRecording recording;
     load("early", {1, 2, 3, 4}, 2, 2)->allocate();
     EXPECT_EQ(GlRecorder::names({"glTexImage2D", "glTexSubImage2D"}), (Names{"glTexImage2D", "glTexImage2D"}));
     EXPECT_EQ(2, GlRecorder::callsNamed("glTexImage2D").at(1).args[3]);
@@ -180,6 +166,7 @@ TEST_F(Recovery, HostImagesReplacedBeforeTheirFirstAllocationOrUnloaded) {
     EXPECT_TRUE(later && load("later", {}, 1, 1) == later);
     EXPECT_EQ(0, std::count(Texture::mAllTextures.begin(), Texture::mAllTextures.end(), later));
 }
+
 
 // The form each CPU the runtime ships for must take: a build that falls back
 // to the portable loop (NEON or SSSE3 not compiled in) fails here. Then every

@@ -9,9 +9,7 @@
 
 #include <algorithm>
 #include <atomic>
-#include <string>
 #include <thread>
-#include <vector>
 
 #include "Application/AnimationManager.h"
 #include "Application/ApplicationVar.h"
@@ -37,8 +35,7 @@ class RecordingScene : public vi::Scene {
 public:
     RecordingScene(const int* size, vi::TexturesMap* textures, int factory)
         : vi::Scene(size), mSerial(++gSerial), mFactory(factory), mTextures(textures) {
-        mNames = gConfig.names;
-        note(TestSceneCreated, size[0], size[1]);
+        mNames = gConfig.names, note(TestSceneCreated, size[0], size[1]);
     }
     ~RecordingScene() override { note(TestSceneDestroyed), delete mPicture; }
 
@@ -87,14 +84,10 @@ private:
 
 extern "C" {
 
-TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
-    return new RecordingScene(size, textures, 1);
-}
+TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap*, vi::TexturesMap* maps) { return new RecordingScene(size, maps, 1); }
 // Not looked up by the runtime: a test puts it into vi::gCreateScene to tell
 // which factory made a scene.
-TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
-    return new RecordingScene(size, textures, 2);
-}
+TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* maps) { return new RecordingScene(size, maps, 2); }
 
 void testSceneClearEvents(void) { gEvents.clear(), gOverlaps = 0; }
 void testSceneReset(void) { testSceneClearEvents(), gConfig = Config(), gSerial = 0; }
@@ -106,9 +99,6 @@ void testSceneSetClearColour(int on, float red, float green, float blue, float a
 void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
 int testSceneEventCount(void) { return int(gEvents.size()); }
 TestSceneEvent testSceneEventAt(int index) { return gEvents.at(std::size_t(index)); }
-int testSceneCount(int kind) {
-    return int(std::count_if(gEvents.begin(), gEvents.end(), [kind](const TestSceneEvent& e) { return e.kind == kind; }));
-}
 int testSceneOverlaps(void) { return gOverlaps; }
 
 #define TESTSCENE_NATIVE(method) Java_com_tarq_test_TestScene_##method
@@ -121,16 +111,14 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectAr
         jstring name = static_cast<jstring>(env->GetObjectArrayElement(names, i));
         const char* chars = env->GetStringUTFChars(name, nullptr);
         gConfig.names.push_back(chars);
-        env->ReleaseStringUTFChars(name, chars);
-        env->DeleteLocalRef(name);
+        env->ReleaseStringUTFChars(name, chars), env->DeleteLocalRef(name);
     }
 }
 
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint result) { gConfig.drawResult = result; }
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean enabled, jfloat red, jfloat green,
-                                                         jfloat blue, jfloat alpha) {
-    testSceneSetClearColour(enabled, red, green, blue, alpha);
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean on, jfloat r, jfloat g, jfloat b, jfloat a) {
+    testSceneSetClearColour(on, r, g, b, a);
 }
 
 // Makes the runtime's next start use createSecondScene, as long as it does not
@@ -139,15 +127,16 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(useSecondFactory)(JNIEnv*, jclass) { vi:
 
 JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return testSceneEventCount(); }
 
-JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) { return testSceneCount(kind); }
+JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) {
+    return jint(std::count_if(gEvents.begin(), gEvents.end(), [kind](const TestSceneEvent& e) { return e.kind == kind; }));
+}
 
 // kind, scene, factory, a, b
 JNIEXPORT jintArray JNICALL TESTSCENE_NATIVE(eventInts)(JNIEnv* env, jclass, jint index) {
     const TestSceneEvent& e = gEvents.at(std::size_t(index));
     const jint values[] = {e.kind, e.scene, e.factory, e.a, e.b};
     jintArray array = env->NewIntArray(5);
-    env->SetIntArrayRegion(array, 0, 5, values);
-    return array;
+    return env->SetIntArrayRegion(array, 0, 5, values), array;
 }
 
 }  // extern "C"

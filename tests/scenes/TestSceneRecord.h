@@ -22,12 +22,7 @@ enum TestSceneEventKind {
 // factory, a parameter's two values, a key's code; x and y: a touch's
 // normalised point; orientation: the scene's during the call; now:
 // vi::AnimationManager::mNow during the call.
-struct TestSceneEvent {
-    int kind, scene, factory, a, b;
-    float x, y;
-    int orientation;
-    float now;
-};
+struct TestSceneEvent { int kind, scene, factory, a, b; float x, y; int orientation; float now; };
 
 // Forgets every event and the overlaps, and restores the defaults: no names,
 // draw result 0, no clearing, no picture, scene serials from 1.
@@ -45,7 +40,6 @@ TESTSCENE_API void testSceneSetPicture(int enabled);
 TESTSCENE_API int testSceneEventCount(void);
 // index from 0 to testSceneEventCount() - 1
 TESTSCENE_API struct TestSceneEvent testSceneEventAt(int index);
-TESTSCENE_API int testSceneCount(int kind);
 // Calls that began while another call into a scene was still running.
 TESTSCENE_API int testSceneOverlaps(void);
 }

@@ -17,14 +17,11 @@ FakeJni::FakeJni() {
     mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean* isCopy) {
         return self(env).lend<jint>(self(env).mElements, array, &Object::ints, isCopy);
     };
-    // Mode 0 writes back and releases, JNI_COMMIT only writes back, JNI_ABORT only releases.
-    mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray array, jint* elements, jint mode) {
-        FakeJni& jni = self(env);
-        auto held = jni.mElements.find(elements);
-        if (held != jni.mElements.end() && held->second == static_cast<void*>(array) && mode != JNI_ABORT)
-            std::copy(elements, elements + held->second->ints.size(), held->second->ints.begin());
-        if (mode != JNI_COMMIT && jni.giveBack(jni.mElements, elements, array, "ReleaseIntArrayElements"))
-            delete[] elements;
+    // Every mode as 0, the one the runtime uses: written back and released.
+    mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray array, jint* elements, jint) {
+        if (!self(env).giveBack(self(env).mElements, elements, array, "ReleaseIntArrayElements")) return;
+        std::copy(elements, elements + self(env).find(array)->ints.size(), self(env).find(array)->ints.begin());
+        delete[] elements;
     };
     mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(name, {})); };
     mTable.NewStringUTF = [](JNIEnv* env, const char* chars) { return self(env).string(chars); };
@@ -62,9 +59,8 @@ bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& va
     Object* found = find(array);
     if (!found || found->text != "java/lang/String") return false;
     values.clear();
-    for (Object* element : found->objects)
-        if (element) values.push_back(element->text);
-    return values.size() == found->objects.size();
+    for (Object* element : found->objects) values.push_back(element ? element->text : "(null)");
+    return std::count(found->objects.begin(), found->objects.end(), nullptr) == 0;
 }
 
 // Objects with elements still handed out stay, so that a late release finds
