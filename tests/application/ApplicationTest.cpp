@@ -21,6 +21,7 @@
 extern "C" vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);
 // The host's entry point, called as the JVM would (it reads neither argument).
 extern "C" int Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(void*, void*, int);
+const auto setOrientation = Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation;
 
 using namespace vi;
 using App = vi::Application;
@@ -40,12 +41,12 @@ std::string taken() {
         if (e.kind >= TestSceneTouchDown && e.kind <= TestSceneTouchMove)
             seen += "(" + std::to_string(e.x) + "," + std::to_string(e.y) + ")";
     }
-    testSceneClearEvents();
-    return seen;
+    return testSceneClearEvents(), seen;
 }
 
 Ints window() {
-    return {ApplicationVar::msWindowLeft, ApplicationVar::msWindowTop, ApplicationVar::msWindowWidth, ApplicationVar::msWindowHeight};
+    return {ApplicationVar::msWindowLeft, ApplicationVar::msWindowTop, ApplicationVar::msWindowWidth,
+            ApplicationVar::msWindowHeight};
 }
 
 // Each call a host may make that must not reach a scene that is not ready.
@@ -57,9 +58,13 @@ void everyEventButInitialisation() {
 
 class Handlers : public ::testing::Test {
 protected:
-    void SetUp() override { App::handleStop(), AnimationManager::mStorage.clear(), testSceneReset(), gCreateScene = createScene; }
+    void SetUp() override {
+        App::handleStop(), AnimationManager::mStorage.clear(), testSceneReset(), gCreateScene = createScene;
+    }
     void TearDown() override { SetUp(); }
-    static void startReady(int l, int t, int w, int h) { App::handleStart(l, t, w, h), App::handleInitEffect(), testSceneClearEvents(); }
+    static void startReady(int l, int t, int w, int h) {
+        App::handleStart(l, t, w, h), App::handleInitEffect(), testSceneClearEvents();
+    }
 };
 
 }  // namespace
@@ -88,8 +93,7 @@ TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
     // A clear restarts the clock after the scene cleared, not before.
     Timer::mStartingCnt = {1, 0}, AnimationManager::mNow = -1.0f, App::handleClearEffect();
     EXPECT_TRUE(testSceneEventAt(0).now == -1.0f && Timer::mStartingCnt.tv_sec != 1 && AnimationManager::mNow >= 0.0f);
-    App::handleRestart(), App::handleStart(0, 0, 540, 960);
-    EXPECT_EQ(0, App::handleDraw()) << "a new scene waits for its initialisation";
+    App::handleRestart(), App::handleStart(0, 0, 540, 960), everyEventButInitialisation();  // waits for its init
     App::handleStop(), everyEventButInitialisation(), App::handleInitEffect();
     EXPECT_TRUE(taken() == "cDC1,1IDC540,960D" && gpScene == nullptr);
 }
@@ -100,11 +104,10 @@ TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
 // reported at once.
 TEST_F(Handlers, EveryNonZeroOrientationIsTheOneAlternateAndWaitsForItsInitialisation) {
     startReady(0, 0, 540, 960);
-    Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(nullptr, nullptr, 7);
+    setOrientation(nullptr, nullptr, 7);
     everyEventButInitialisation();
     for (int value : {7, -1, 2, INT_MAX, INT_MIN, 1, 0, INT_MIN}) {
-        App::handleInitEffect(), Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(nullptr, nullptr, value);
-        App::handleDraw();
+        App::handleInitEffect(), setOrientation(nullptr, nullptr, value), App::handleDraw();
         EXPECT_EQ(testSceneEventAt(testSceneEventCount() - 1).orientation, value);
     }
     EXPECT_EQ(taken(), "AFFFFFFFF");
@@ -124,8 +127,7 @@ TEST(Clock, SecondsAndNanosecondsAreConvertedSeparatelyInSinglePrecision) {
     // A long run with a negative nanosecond difference: at a million seconds a
     // float keeps sixteenths, so only the single-precision sum of the two
     // converted differences comes out exactly.
-    Timer::restart();  // the current time in mStartingCnt
-    Timer::mStartingCnt = {Timer::mStartingCnt.tv_sec - 1000003, 999999999}, Timer::update();
+    Timer::restart(), Timer::mStartingCnt = {Timer::mStartingCnt.tv_sec - 1000003, 999999999}, Timer::update();
     const float seconds = float(std::int32_t(Timer::mCurrentCnt.tv_sec - Timer::mStartingCnt.tv_sec));
     EXPECT_EQ(AnimationManager::mNow, float(std::int32_t(Timer::mCurrentCnt.tv_nsec - 999999999)) * 1e-9f + seconds);
     EXPECT_NEAR(AnimationManager::mNow, seconds - 1.0 + Timer::mCurrentCnt.tv_nsec * 1e-9, 0.07);
@@ -144,7 +146,7 @@ TEST_F(Handlers, AReadyFrameUpdatesTheAnimationsInOrderWithTheClockReadAfreshBef
     late.run = [&](float) { order += '4'; };
     AnimationManager::mStorage = {&first, &second, &third};
     App::handleStart(0, 0, 540, 960), App::handleDraw(), App::handleInitEffect(), App::handleDraw();
-    EXPECT_TRUE(times.at(0) >= 0.0f && times[0] < 100.0f && times.at(1) == times[0] + 100.0f && times.at(2) == times[1]);
+    EXPECT_TRUE(times.at(0) >= 0 && times[0] < 100 && times.at(1) == times[0] + 100 && times.at(2) == times[1]);
     EXPECT_EQ(testSceneEventAt(testSceneEventCount() - 1).now, times[2]) << "the scene draws after them";
     EXPECT_EQ((App::handleDraw(), order), "1231234");
 }
@@ -152,14 +154,16 @@ TEST_F(Handlers, AReadyFrameUpdatesTheAnimationsInOrderWithTheClockReadAfreshBef
 TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
     const int kCalls = 10000;
     startReady(0, 0, 540, 960);
-    auto run = [](std::function<void(int)> call) { return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); }); };
+    auto run = [](std::function<void(int)> call) {
+        return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); });
+    };
     std::thread threads[] = {run([](int) { App::handleDraw(); }), run([](int) { App::handleDraw(); }),
                              run([](int i) { (i % 2 ? App::handleMouseUp : App::handleMouseDown)(i, i); }),
                              run([](int i) { App::handleParam(i, -i); }),
                              // the host's keys, and the developer keys that stay under the lock
                              run([](int i) { App::handleKey(Ints{0, 1, 2, 'A', 'U'}[i % 5]); })};
     for (std::thread& thread : threads) thread.join();
-    EXPECT_TRUE(testSceneOverlaps() == 0 && testSceneEventCount() == 5 * kCalls) << "one event a call ('A' skips the clear)";
+    EXPECT_TRUE(testSceneOverlaps() == 0 && testSceneEventCount() == 5 * kCalls) << "one event a call, 'A' too";
 }
 
 // The key 'C' takes the lock the key handler already holds: the thread never
@@ -178,8 +182,7 @@ TEST_F(Handlers, LetterCBlocksTheCallingThreadForGood) {
     pollfd afterKey = {reports[0], POLLIN, 0};
     EXPECT_TRUE(read(reports[0], &report, 1) == 1 && report == 'B');
     EXPECT_EQ(poll(&afterKey, 1, 2000), 0) << "the key returned (or the child ended)";
-    kill(child, SIGKILL);
-    EXPECT_TRUE(waitpid(child, &status, 0) == child && WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
+    EXPECT_TRUE(kill(child, SIGKILL) == 0 && waitpid(child, &status, 0) == child && WIFSIGNALED(status));
 }
 
 namespace {
@@ -197,7 +200,9 @@ struct SelfTestSteps {
         seen += kind + ("(" + std::to_string(float(int(rx % width)) / float(width)) + "," +
                         std::to_string(1.0f - float(int(ry % height)) / float(height)) + ")F");
     }
-    void orientationRestarts() { for (unsigned i = 0, n = count(); i < n; ++i) seen += started() + (i & 1 ? "AF" : "F"); }
+    void orientationRestarts() {
+        for (unsigned i = 0, n = count(); i < n; ++i) seen += started() + (i & 1 ? "AF" : "F");
+    }
     void gestures(bool sharedCounter) {
         unsigned i = 0, n = count();
         for (unsigned gesture = 0; sharedCounter ? i < n : gesture < n; ++gesture, ++i) {

@@ -28,8 +28,7 @@ struct Config {
 } gConfig;
 std::vector<TestSceneEvent> gEvents;
 int gSerial = 0;
-std::atomic<bool> gInside(false);
-std::atomic<int> gOverlaps(0);
+std::atomic<int> gInside(0), gOverlaps(0);
 
 class RecordingScene : public vi::Scene {
 public:
@@ -69,10 +68,10 @@ private:
     // Gives up the processor once inside, so that a call let in without the
     // lock finds the flag set.
     void note(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
-        if (gInside.exchange(true)) ++gOverlaps;
+        if (gInside.exchange(1)) ++gOverlaps;
         std::this_thread::yield();
         gEvents.push_back({kind, mSerial, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});
-        gInside.store(false);
+        gInside.store(0);
     }
 
     int mSerial, mFactory;
@@ -84,10 +83,12 @@ private:
 
 extern "C" {
 
-TESTSCENE_API vi::Scene* createScene(int* size, vi::ModelsMap*, vi::TexturesMap* maps) { return new RecordingScene(size, maps, 1); }
+TESTSCENE_API vi::Scene* createScene(int* s, vi::ModelsMap*, vi::TexturesMap* t) { return new RecordingScene(s, t, 1); }
 // Not looked up by the runtime: a test puts it into vi::gCreateScene to tell
 // which factory made a scene.
-TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* maps) { return new RecordingScene(size, maps, 2); }
+TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
+    return new RecordingScene(size, textures, 2);
+}
 
 void testSceneClearEvents(void) { gEvents.clear(), gOverlaps = 0; }
 void testSceneReset(void) { testSceneClearEvents(), gConfig = Config(), gSerial = 0; }
@@ -117,7 +118,8 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectAr
 
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint result) { gConfig.drawResult = result; }
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean on, jfloat r, jfloat g, jfloat b, jfloat a) {
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean on, jfloat r, jfloat g, jfloat b,
+                                                         jfloat a) {
     testSceneSetClearColour(on, r, g, b, a);
 }
 
@@ -128,7 +130,7 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(useSecondFactory)(JNIEnv*, jclass) { vi:
 JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return testSceneEventCount(); }
 
 JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) {
-    return jint(std::count_if(gEvents.begin(), gEvents.end(), [kind](const TestSceneEvent& e) { return e.kind == kind; }));
+    return jint(std::count_if(gEvents.begin(), gEvents.end(), [kind](const auto& e) { return e.kind == kind; }));
 }
 
 // kind, scene, factory, a, b

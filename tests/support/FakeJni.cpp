@@ -66,12 +66,10 @@ bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& va
 // Objects with elements still handed out stay, so that a late release finds
 // its owner; only the handles die, as local references do.
 void FakeJni::reset() {
-    mObjects.erase(std::remove_if(mObjects.begin(), mObjects.end(),
-                                  [this](const std::unique_ptr<Object>& owned) {
-                                      return std::none_of(mElements.begin(), mElements.end(),
-                                                          [&](const auto& l) { return l.second == owned.get(); });
-                                  }),
-                   mObjects.end());
+    auto leased = [this](const std::unique_ptr<Object>& owned) {
+        return std::any_of(mElements.begin(), mElements.end(), [&](const auto& l) { return l.second == owned.get(); });
+    };
+    mObjects.erase(std::stable_partition(mObjects.begin(), mObjects.end(), leased), mObjects.end());
 }
 
 }  // namespace vitest

@@ -28,11 +28,10 @@ VI_NATIVE_PLAIN(prehandlePause) VI_NATIVE_PLAIN(prehandleDraw) VI_NATIVE_PLAIN(p
 VI_NATIVE_PLAIN(prehandleVolumeUpPressed) VI_NATIVE_PLAIN(prehandleVolumeDownPressed)
 VI_NATIVE_PLAIN(prehandleClearEffect) VI_NATIVE_PLAIN(prehandleAffordance) VI_NATIVE_PLAIN(prehandleUnlock)
 jobjectArray VI_NATIVE(prehandleStart)(JNIEnv*, jobject, jstring, jint, jint);
-void VI_NATIVE(prehandleRecycleTextures)(JNIEnv*, jobject);
+void VI_NATIVE(prehandleRecycleTextures)(JNIEnv*, jobject), VI_NATIVE(loadModel)(JNIEnv*, jobject, jstring);
 void VI_NATIVE(prehandleTouch)(JNIEnv*, jobject, jint, jint, jint);
 jint VI_NATIVE(prehandleParam)(JNIEnv*, jobject, jint, jint);
 jint VI_NATIVE(prehandleSetOrientation)(JNIEnv*, jobject, jint);
-void VI_NATIVE(loadModel)(JNIEnv*, jobject, jstring);
 void VI_NATIVE(loadTexture)(JNIEnv*, jclass, jstring, jintArray, jint, jint);
 }
 
