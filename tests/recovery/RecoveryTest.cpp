@@ -8,7 +8,7 @@
 #include <pthread.h>
 
 #include <cstdint>
-#include <memory>
+#include <algorithm>
 
 #include "Application/Application.h"
 #include "Application/ApplicationVar.h"
