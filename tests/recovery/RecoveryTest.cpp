@@ -17,6 +17,7 @@
 #include "GlRecorder.h"
 #include "Pictures.h"
 #include "Render/Renderer.h"
+#include "Render/Texture.h"
 #include "TestSceneRecord.h"
 
 extern "C" vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);
@@ -59,10 +60,7 @@ protected:
         VI_NATIVE(loadTexture)(jni.env(), nullptr, jni.string(name), px.empty() ? nullptr : jni.intArray(px), w, h);
         return jni.reset(), ApplicationVar::msTexturesMap[name];
     }
-    static Frame frame() {
-        EXPECT_EQ(7, Application::handleDraw());
-        return readWords(0, 0, kSize, kSize);
-    }
+    static Frame frame() { EXPECT_EQ(7, Application::handleDraw()); return readWords(0, 0, kSize, kSize); }
 
     std::unique_ptr<vitest::GlContext> context;
     vitest::FakeJni jni;
