@@ -4,9 +4,13 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <stdlib.h>
 #include <unistd.h>
 
 #include <cstdint>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <memory>
 #include <string>
 #include <vector>
@@ -17,7 +21,6 @@
 #include "Render/LightRenderer.h"
 #include "Render/ModelObject.h"
 #include "Render/RenderableTexture.h"
-#include "Scratch.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/FatalReport.h"
 #include "Tools/File.h"
@@ -31,16 +34,29 @@ namespace {
 
 constexpr std::uint32_t kTexel = 0xC86432FF, kBlue = 0x0000FFFF;
 
-// A scratch directory as the asset and the external-storage directory.
-struct AssetDirectory : vitest::ScratchDirectory {
-    AssetDirectory() : manager(vi::DirectoryAssetManager::create(path())) {
+// A fresh directory under /tmp as the asset and the external-storage
+// directory, removed with everything in it at the end.
+struct AssetDirectory {
+    AssetDirectory() : manager(vi::DirectoryAssetManager::create(mkdtemp(path))) {
         vi::File::getAssetManager() = manager;
-        vi::File::setExternalStorageDirectory(path() + "/");
+        vi::File::setExternalStorageDirectory(pathOf(""));
     }
     ~AssetDirectory() {
         vi::File::getAssetManager() = nullptr;
         vi::DirectoryAssetManager::destroy(manager);
+        std::filesystem::remove_all(path);
     }
+    std::string pathOf(const std::string& name) const { return std::string(path) + "/" + name; }
+    void write(const std::string& name, const std::string& bytes) const {
+        std::filesystem::create_directories(std::filesystem::path(pathOf(name)).parent_path());
+        std::ofstream(pathOf(name), std::ios::binary) << bytes;
+    }
+    Bytes read(const std::string& name) const {
+        std::ifstream in(pathOf(name), std::ios::binary);
+        return Bytes(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
+    }
+
+    char path[20] = "/tmp/vi-test-XXXXXX";
     AAssetManager* manager;
 };
 
@@ -109,7 +125,7 @@ TEST(FileDeathTest, MissingAssetExits71AndMissingFileExits45WithOnlyTheReport) {
 
 TEST(File, LoadTakesTheWholeFileAndWritesCollectUntilAFlushThatAlwaysEmptiesTheBuffer) {
     AssetDirectory assets;
-    assets.write("data/bytes.bin", Bytes{'\0', 'a', char(0xFF), '\n', 'z'});
+    assets.write("data/bytes.bin", std::string("\0a\xFF\nz", 5));
     assets.write("empty.bin", "");
     vi::File file;
     file.write("12345678", 8);
@@ -129,7 +145,7 @@ TEST(File, LoadTakesTheWholeFileAndWritesCollectUntilAFlushThatAlwaysEmptiesTheB
     EXPECT_EQ(assets.read("a.raw"), Bytes{'Z'});
     file.write("abc", 3);
     file.flush("no/such/directory/a.raw", false);
-    EXPECT_FALSE(assets.exists("no"));
+    EXPECT_FALSE(std::filesystem::exists(assets.pathOf("no")));
     EXPECT_EQ(file.getLength(), 0u);
 }
 

@@ -15,7 +15,7 @@
 #include "Entry/HostImage.h"
 #include "FakeJni.h"
 #include "GlRecorder.h"
-#include "Pictures.h"
+#include "Painters.h"
 #include "Render/Renderer.h"
 #include "Render/Texture.h"
 #include "TestSceneRecord.h"

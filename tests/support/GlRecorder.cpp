@@ -1,6 +1,5 @@
 #include "GlRecorder.h"
 
-#include <EGL/egl.h>
 #include <GLES2/gl2.h>
 
 #include <algorithm>
@@ -49,7 +48,10 @@ std::vector<std::string> GlRecorder::names(const std::vector<std::string>& filte
 
 int GlRecorder::count(const std::string& name) { return int(calls({name}).size()); }
 
-void GlRecorder::setRendererOverride(const char* renderer) { gRendererOverride = renderer; }
+bool GlRecorder::setRendererOverride(const char* renderer) {
+    gRendererOverride = renderer;
+    return true;
+}
 
 void GlRecorder::record(const char* name, std::vector<double> args, const char* text) {
     if (!gRecording) return;
@@ -61,16 +63,15 @@ void GlRecorder::record(const char* name, std::vector<double> args, const char* 
 
 namespace {
 
-// A name or a source is kept as the call's text; names (made ones are read
-// after the call) and uniform values as their first element; other pointers
-// as addresses.
+// A name or a source is kept as the call's text; the first of an array of
+// names (made ones are read after the call) as a number; other pointers as
+// addresses.
 template <class T>
 void add(std::vector<double>& args, const char*& text, T value) {
     if constexpr (std::is_same_v<T, const GLchar*>) text = value;
     else if constexpr (std::is_same_v<T, const GLchar* const*>) text = value[0];
-    else if constexpr (std::is_same_v<T, GLuint*> || std::is_same_v<T, const GLuint*> ||
-                       std::is_same_v<T, const GLint*> || std::is_same_v<T, const GLfloat*>)
-        args.push_back(value ? double(*value) : 0.0);
+    else if constexpr (std::is_same_v<T, GLuint*> || std::is_same_v<T, const GLuint*>)
+        args.push_back(double(*value));
     else if constexpr (std::is_pointer_v<T>) args.push_back(double(reinterpret_cast<std::uintptr_t>(value)));
     else args.push_back(double(value));
 }
@@ -101,7 +102,6 @@ auto forward(const char* name, Real real) {
     extern "C" ret __wrap_##name params { return forward<ret>(#name, [&] { return __real_##name args; }) args; }
 
 // The list vi_link_recorded() wraps is read from the lines below.
-WRAP(EGLContext, eglGetCurrentContext, (), ())
 WRAP(void, glActiveTexture, (GLenum a), (a))
 WRAP(void, glAttachShader, (GLuint a, GLuint b), (a, b))
 WRAP(void, glBindBuffer, (GLenum a, GLuint b), (a, b))
@@ -126,14 +126,12 @@ WRAP(void, glDeleteTextures, (GLsizei a, const GLuint* b), (a, b))
 WRAP(void, glDetachShader, (GLuint a, GLuint b), (a, b))
 WRAP(void, glDrawArrays, (GLenum a, GLint b, GLsizei c), (a, b, c))
 WRAP(void, glDrawElements, (GLenum a, GLsizei b, GLenum c, const void* d), (a, b, c, d))
-WRAP(void, glEnableVertexAttribArray, (GLuint a), (a))
 WRAP(void, glFramebufferRenderbuffer, (GLenum a, GLenum b, GLenum c, GLuint d), (a, b, c, d))
 WRAP(void, glFramebufferTexture2D, (GLenum a, GLenum b, GLenum c, GLuint d, GLint e), (a, b, c, d, e))
 WRAP(void, glGenBuffers, (GLsizei a, GLuint* b), (a, b))
 WRAP(void, glGenFramebuffers, (GLsizei a, GLuint* b), (a, b))
 WRAP(void, glGenRenderbuffers, (GLsizei a, GLuint* b), (a, b))
 WRAP(void, glGenTextures, (GLsizei a, GLuint* b), (a, b))
-WRAP(GLint, glGetAttribLocation, (GLuint a, const GLchar* b), (a, b))
 WRAP(void, glGetProgramInfoLog, (GLuint a, GLsizei b, GLsizei* c, GLchar* d), (a, b, c, d))
 WRAP(void, glGetProgramiv, (GLuint a, GLenum b, GLint* c), (a, b, c))
 WRAP(void, glGetShaderInfoLog, (GLuint a, GLsizei b, GLsizei* c, GLchar* d), (a, b, c, d))
@@ -151,18 +149,6 @@ WRAP(void, glTexImage2D, (GLenum a, GLint b, GLint c, GLsizei d, GLsizei e, GLin
 WRAP(void, glTexParameteri, (GLenum a, GLenum b, GLint c), (a, b, c))
 WRAP(void, glTexSubImage2D, (GLenum a, GLint b, GLint c, GLint d, GLsizei e, GLsizei f, GLenum g, GLenum h,
                              const void* i), (a, b, c, d, e, f, g, h, i))
-WRAP(void, glUniform1i, (GLint a, GLint b), (a, b))
-WRAP(void, glUniform1fv, (GLint a, GLsizei b, const GLfloat* c), (a, b, c))
-WRAP(void, glUniform2fv, (GLint a, GLsizei b, const GLfloat* c), (a, b, c))
-WRAP(void, glUniform3fv, (GLint a, GLsizei b, const GLfloat* c), (a, b, c))
-WRAP(void, glUniform4fv, (GLint a, GLsizei b, const GLfloat* c), (a, b, c))
-WRAP(void, glUniform1iv, (GLint a, GLsizei b, const GLint* c), (a, b, c))
-WRAP(void, glUniform2iv, (GLint a, GLsizei b, const GLint* c), (a, b, c))
-WRAP(void, glUniform3iv, (GLint a, GLsizei b, const GLint* c), (a, b, c))
-WRAP(void, glUniform4iv, (GLint a, GLsizei b, const GLint* c), (a, b, c))
-WRAP(void, glUniformMatrix2fv, (GLint a, GLsizei b, GLboolean c, const GLfloat* d), (a, b, c, d))
-WRAP(void, glUniformMatrix3fv, (GLint a, GLsizei b, GLboolean c, const GLfloat* d), (a, b, c, d))
-WRAP(void, glUniformMatrix4fv, (GLint a, GLsizei b, GLboolean c, const GLfloat* d), (a, b, c, d))
 WRAP(void, glUseProgram, (GLuint a), (a))
 WRAP(void, glVertexAttribPointer, (GLuint a, GLint b, GLenum c, GLboolean d, GLsizei e, const void* f),
      (a, b, c, d, e, f))

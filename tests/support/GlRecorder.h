@@ -1,6 +1,6 @@
 #pragma once
 
-// Records the GL (and eglGetCurrentContext) calls the runtime makes, on their
+// Records the GL calls the runtime makes, on their
 // way to the real driver: binaries linked with vi_link_recorded() route every
 // call of the functions wrapped in GlRecorder.cpp through -Wl,--wrap wrappers
 // that call the driver and then append the call to a log.
@@ -31,8 +31,8 @@ public:
     static int count(const std::string& name);
 
     // Makes glGetString(GL_RENDERER) answer `renderer`. For a test binary of
-    // its own: the runtime reads it once per process.
-    static void setRendererOverride(const char* renderer);
+    // its own: the runtime reads it once per process. True, for a static initialiser.
+    static bool setRendererOverride(const char* renderer);
 
     static void record(const char* name, std::vector<double> args, const char* text = nullptr);
 };

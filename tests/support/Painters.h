@@ -1,16 +1,18 @@
 #pragma once
 
-// Quads over the whole viewport drawn by the runtime's own renderer: painted
-// in one colour (read from the painter's variable at every draw, so a test
-// changes it between frames), or from a texture (one texel per pixel when the
-// viewport has the texture's size).
+// Pixels as the tests read them back (0xRRGGBBAA words), and quads over the
+// whole viewport drawn by the runtime's own renderer: painted in one colour
+// (read from the painter's variable at every draw, so a test changes it
+// between frames), or from a texture (one texel per pixel when the viewport
+// has the texture's size).
 
 #include <cstdint>
+#include <cstdlib>
 #include <vector>
 
 #include <glm/glm.hpp>
 
-#include "Pictures.h"
+#include "GlContext.h"
 #include "Render/Drawable.h"
 #include "Render/GL.h"
 #include "Render/Renderer.h"
@@ -20,6 +22,26 @@
 
 namespace vitest {
 
+// RGBA bytes as one 0xRRGGBBAA value, the form readPixel() returns.
+inline std::uint32_t rgba(const std::uint8_t* p) {
+    return (std::uint32_t(p[0]) << 24) | (std::uint32_t(p[1]) << 16) | (std::uint32_t(p[2]) << 8) | p[3];
+}
+
+// The current framebuffer's rectangle as 0xRRGGBBAA words, bottom row first.
+inline std::vector<std::uint32_t> readWords(int x, int y, int width, int height) {
+    const std::vector<std::uint8_t> bytes = readPixels(x, y, width, height);
+    std::vector<std::uint32_t> words;
+    for (std::size_t i = 0; i < bytes.size(); i += 4) words.push_back(rgba(&bytes[i]));
+    return words;
+}
+
+// Every channel of two 0xRRGGBBAA words within `tolerance` of the other's.
+inline bool near(std::uint32_t a, std::uint32_t b, int tolerance) {
+    for (int shift = 0; shift < 32; shift += 8)
+        if (std::abs(int(a >> shift & 0xFF) - int(b >> shift & 0xFF)) > tolerance) return false;
+    return true;
+}
+
 inline const char* quadVertexShader() {
     return "attribute vec2 aPosition;\n"
            "uniform mat4 uModelViewProjectionMatrix;\n"
@@ -28,14 +50,6 @@ inline const char* quadVertexShader() {
            "  vUv = aPosition * 0.5 + 0.5;\n"
            "  gl_Position = uModelViewProjectionMatrix * vec4(aPosition, 0.0, 1.0);\n"
            "}\n";
-}
-
-// Samples uTexture at vTexCoord: the fragment half of the tests' textured quads.
-inline const char* textureFragmentShader() {
-    return "precision mediump float;\n"
-           "uniform sampler2D uTexture;\n"
-           "varying vec2 vTexCoord;\n"
-           "void main() { gl_FragColor = texture2D(uTexture, vTexCoord); }\n";
 }
 
 // The quad over the whole viewport, as a drawable.
