@@ -136,20 +136,17 @@ TEST_F(RenderTest, ProgramCompilesVertexFirstKeepsNoShaderAndUnbindsItselfBefore
     EXPECT_EQ(Args({GlRecorder::calls()[0].args[0], GlRecorder::calls()[1].args[0]}), (Args{0, name}));
 }
 
-// A fresh process for each child: a forked copy of a live GL driver is not safe.
-TEST(ShaderProgramDeath, FragmentSyntaxErrorExits88AfterTheVertexShaderCompiled) {
+// A fresh process for each child: a forked copy of a live GL driver is not
+// safe. A compile error keeps the vertex shader, compiled first, and deletes
+// only the failing one; a link error deletes both shaders, then the program.
+TEST(ShaderProgramDeath, FragmentSyntaxErrorExits88AndShadersThatDoNotLinkExit67) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
-    // The vertex shader is compiled and kept; only the failing shader is deleted.
     EXPECT_EXIT(buildProgramAndWatchTheExit("precision mediump float;\nvoid main() { gl_FragColor = vec4(1.0) }\n"),
                 testing::ExitedWithCode(88),
                 testing::MatchesRegex(report("0:2\\([0-9]+\\): error: .+", "compileShader", 88,
                                              "glCreateShader\\(vertex\\) glShaderSource glCompileShader glGetShaderiv "
                                              "glCreateShader\\(fragment\\) glShaderSource glCompileShader "
                                              "glGetShaderiv glGetShaderInfoLog glDeleteShader\\(fragment\\)")));
-}
-
-TEST(ShaderProgramDeath, ShadersThatCompileButDoNotLinkExit67) {
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
     EXPECT_EXIT(buildProgramAndWatchTheExit("precision mediump float;\nvarying vec3 vValue;\n"
                                             "void main() { gl_FragColor = vec4(vValue, 1.0); }\n"),
                 testing::ExitedWithCode(67),

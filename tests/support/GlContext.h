@@ -26,7 +26,6 @@ public:
     // Destroys this object's context and makes a fresh one current (Mesa may hand back the same handle).
     void recreate();
     static void releaseCurrent();
-    EGLContext secondContext() const { return mSecond; }
 
 private:
     void use(EGLContext context);
