@@ -20,7 +20,6 @@
 #include "Render/Background.h"
 #include "Render/LightRenderer.h"
 #include "Render/ModelObject.h"
-#include "Render/RenderableTexture.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/FatalReport.h"
 #include "Tools/File.h"
@@ -229,7 +228,7 @@ TEST_F(Framework, RenderersShareOneProgramEachWithTheRuntimesShaderTextsUntilThe
     EXPECT_FALSE(glIsProgram(backgroundProgram));
 }
 
-TEST_F(Framework, BackgroundShowsTheFirstRowAtTheTopStretchedWhateverTheOpacityAndATargetBehindItIsRedrawn) {
+TEST_F(Framework, BackgroundShowsTheFirstRowAtTheTopStretchedWhateverTheOpacity) {
     // First row red, green; second row blue, white.
     std::uint8_t quadrants[16] = {255, 0, 0, 255, 0, 255, 0, 255, 0, 0, 255, 255, 255, 255, 255, 255};
     vi::Texture texture(quadrants, 2, 2, true, false, false, false, false, 4, false);
@@ -244,13 +243,4 @@ TEST_F(Framework, BackgroundShowsTheFirstRowAtTheTopStretchedWhateverTheOpacityA
     vi::Renderer::setBlending(false);
     EXPECT_EQ(std::vector<std::uint32_t>({readPixel(32, 16), readPixel(31, 15), readPixel(62, 1), readPixel(8, 40)}),
               (std::vector<std::uint32_t>{0x00FF00FF, 0x0000FFFF, 0xFFFFFFFF, kBlue}));
-
-    vitest::ColourPainter painter(glm::vec4(1, 0, 0, 1));
-    std::vector<vi::Renderer*> scene{painter.renderer()};
-    vi::RenderableTexture target(scene, 0, 0, 16, 16, false, false, false, false, false);
-    vi::RenderableTexture::mCurrentFrameBufferSize = glm::ivec2(64, 64);  // the window, which each pass restores
-    vi::Background behind(target);
-    EXPECT_EQ(draw(*behind.renderer), 0xFF0000FFu);
-    painter.colour = glm::vec4(0, 1, 0, 1);
-    EXPECT_EQ(draw(*behind.renderer, 62, 62), 0x00FF00FFu);
 }
