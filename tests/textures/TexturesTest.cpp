@@ -53,13 +53,13 @@ Args argumentOf(const std::string& name, int index) {
 // The binding as GL and the statics see it: framebuffer and viewport, then
 // the static framebuffer, position and size.
 std::vector<int> bindingNow() {
-    GLint frameBuffer = -1, viewport[4] = {};
-    glGetIntegerv(GL_FRAMEBUFFER_BINDING, &frameBuffer);
-    glGetIntegerv(GL_VIEWPORT, viewport);
+    std::vector<int> binding(5);
+    glGetIntegerv(GL_FRAMEBUFFER_BINDING, &binding[0]);
+    glGetIntegerv(GL_VIEWPORT, &binding[1]);
     const glm::ivec2 position = RenderableTexture::mCurrentFrameBufferPosition;
     const glm::ivec2 size = RenderableTexture::mCurrentFrameBufferSize;
-    return {frameBuffer, viewport[0], viewport[1], viewport[2], viewport[3],
-            int(RenderableTexture::mCurrentFrameBuffer), position.x, position.y, size.x, size.y};
+    binding.insert(binding.end(), {int(RenderableTexture::mCurrentFrameBuffer), position.x, position.y, size.x, size.y});
+    return binding;
 }
 
 std::vector<int> bindingOf(GLuint frameBuffer, int width, int height) {
