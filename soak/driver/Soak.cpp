@@ -13,6 +13,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <ctime>
 #include <map>
@@ -21,7 +22,6 @@
 #include <utility>
 
 #include "Application/AnimationManager.h"
-#include "Application/Application.h"
 #include "Application/ApplicationVar.h"
 #include "FakeJni.h"
 #include "GlContext.h"
@@ -33,20 +33,19 @@ namespace {
 
 const int kCanvas = 64, kDrawn = 7;  // the pbuffer drawn into; what the test scene's frames return
 const unsigned kHangSeconds = 30, kShrinkSeconds = 300;  // a child still playing then ends with SIGALRM
-const char* const kLibraries[] = {VI_SOAK_SCENE, VI_SOAK_NOFACTORY, "/nonexistent/libeffect.so"};
 
-enum Kind { Start, Recycle, Draw, Touch, Key, Param, Orientation, Image, Switch, Loss, NoContext, Plain, Restart };
+enum Kind { Start, Recycle, Draw, Touch, Param, Orientation, Image, Switch, Loss, NoContext, Plain, Restart };
 // Each kind of call: its name, how often it comes in a hundred calls (frames
 // and input most, as with a real host), the entry point of those that take no
 // argument, and the range of each argument of the others.
 using Range = std::pair<int, int>;
 struct KindInfo { const char* name; int weight; jint (*entry)(JNIEnv*, jobject); std::vector<Range> ranges; };
 const KindInfo kKinds[] = {
-    {"start", 4, nullptr, {{0, 19}, {-40, 1200}, {-40, 2000}}}, {"recycleTextures", 2, nullptr, {}},
-    {"draw", 30, nullptr, {}}, {"touch", 10, nullptr, {{-100, 1200}, {-100, 2000}, {-1, 3}}},
-    {"key", 3, nullptr, {{60, 90}}}, {"param", 4, nullptr, {{-1000, 1000}, {-1000, 1000}}},
-    {"setOrientation", 3, nullptr, {{-1, 2}}}, {"loadTexture", 10, nullptr, {{0, 9}, {0, 3}, {0, 39}, {0, 5}}},
-    {"contextSwitch", 3, nullptr, {}}, {"contextLoss", 3, nullptr, {}}, {"contextNone", 2, nullptr, {}},
+    {"start", 4, nullptr, {{-40, 1200}, {-40, 2000}}}, {"recycleTextures", 2, nullptr, {}},
+    {"draw", 33, nullptr, {}}, {"touch", 10, nullptr, {{-100, 1200}, {-100, 2000}, {-1, 3}}},
+    {"param", 4, nullptr, {{-1000, 1000}, {-1000, 1000}}}, {"setOrientation", 3, nullptr, {{-1, 2}}},
+    {"loadTexture", 10, nullptr, {{0, 9}, {0, 3}, {0, 39}, {0, 5}}}, {"contextSwitch", 3, nullptr, {}},
+    {"contextLoss", 3, nullptr, {}}, {"contextNone", 2, nullptr, {}},
     {"initEffect", 12, VI_NATIVE(prehandleInitEffect), {}}, {"restart", 3, VI_NATIVE(prehandleRestart), {}},
     {"stop", 2, VI_NATIVE(prehandleStop), {}}, {"menu", 1, VI_NATIVE(prehandleMenuPressed), {}},
     {"volumeUp", 1, VI_NATIVE(prehandleVolumeUpPressed), {}}, {"unlock", 2, VI_NATIVE(prehandleUnlock), {}},
@@ -67,7 +66,6 @@ std::vector<Call> sequence(std::uint64_t seed, int index) {
         if (i && calls[i - 1].kind >= Switch && calls[i - 1].kind < Plain && between(0, 3)) call.kind = Draw;
         int* value = call.v;
         for (const Range& range : kKinds[call.kind].ranges) *value++ = between(range.first, range.second);
-        if (call.kind == Key && call.v[0] == 'C') ++call.v[0];  // 'C' blocks its caller for good, by design
         if (call.kind == Orientation && between(0, 7) == 0) call.v[0] = int(std::uint32_t(random()));  // any int
     }
     return calls;
@@ -76,49 +74,47 @@ std::vector<Call> sequence(std::uint64_t seed, int index) {
 // Plays the calls `only` of sequence `index` (all when empty) as the host's
 // Java side would: through the JNI entry points, on the thread that owns the
 // GL context. It knows only what a host knows of its own calls, to skip those
-// a host does not make: a restart before a start that returned names, a second
-// start of a library that failed, images with no context current, a name
-// loaded again once unloaded, the scene's picture unloaded. So any part of a
+// a host does not make: a restart before a start, images with no context
+// current, a name loaded again once unloaded, the scene's picture unloaded. So any part of a
 // sequence is one a host may play, which shrinking relies on. The exit status.
 int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
     const std::vector<Call> calls = sequence(seed, index);
-    if (only.empty()) only.resize(calls.size()), std::iota(only.begin(), only.end(), 0);
+    if (only.empty()) {
+        only.resize(calls.size());
+        std::iota(only.begin(), only.end(), 0);
+    }
     alarm(kHangSeconds);
     vitest::GlContext gl(kCanvas, kCanvas);
     vitest::FakeJni jni;
     JNIEnv* const env = jni.env();
-    const jobject thiz = jni.thiz();
-    const char* names[] = {"picture"};  // the scene shows the image filed under its first name
-    testSceneSetNames(names, 1);
-    testSceneSetDrawResult(kDrawn);
-    testSceneSetClearColour(1, 0.25f, 0.5f, 0.75f, 1.0f);
-    testSceneSetPicture(1);
+    const jobject thiz = nullptr;  // the runtime's entry points never read it
+    gTestScene.names = {"picture"};  // the scene shows the image filed under its first name
+    gTestScene.drawResult = kDrawn;
+    gTestScene.clear = true;  // so that every frame it draws is defined
+    gTestScene.picture = true;
     enum { First, Second, None } context = First;
-    int started = 0, failed = 0, unloaded = 0;  // a start returned names; libraries whose start failed; names unloaded
-    std::vector<std::uint8_t> atChange;         // the frame drawn in the last call, when it changed the context
+    bool started = false;
+    int unloaded = 0;                    // names unloaded
+    std::vector<std::uint8_t> atChange;  // the frame drawn in the last call, when it changed the context
     auto frame = [&] {  // read back; nothing when the scene drew none or no context is current
         const bool drawn = VI_NATIVE(prehandleDraw)(env, thiz) == kDrawn && context != None;
         return drawn ? vitest::readPixels(0, 0, kCanvas, kCanvas) : std::vector<std::uint8_t>();
     };
     for (const int i : only) {
         const Call& c = calls.at(std::size_t(i));
-        const int library = c.v[0] < 15 ? 0 : c.v[0] < 17 ? 1 : 2;
         const int w = c.v[2] == 39 ? 1080 : c.v[2] % 13 * 5, h = c.v[2] == 39 ? 1920 : c.v[2] % 9 * 7;
         const std::string image = c.v[0] < 6 ? "picture" : "image-" + std::to_string(unloaded);
-        if ((c.kind == Start && (failed >> library & 1)) || (c.kind == Restart && !started) ||
-            (c.kind == Image && (context == None || (c.v[3] == 0 && image == "picture"))))
+        if ((c.kind == Restart && !started) || (c.kind == Image && (context == None || (!c.v[3] && image == "picture"))))
             continue;
         if (verbose) std::printf("  %3d: %s %d %d %d %d\n", i, kKinds[c.kind].name, c.v[0], c.v[1], c.v[2], c.v[3]);
         jni.reset();
         std::vector<std::uint8_t> before = std::exchange(atChange, {}), after;
         if (c.kind >= Plain) kKinds[c.kind].entry(env, thiz);
-        const jstring path = jni.string(kLibraries[library]);
-        if (c.kind == Start) started = VI_NATIVE(prehandleStart)(env, thiz, path, c.v[1], c.v[2]) != nullptr;
-        if (c.kind == Start && !started) failed |= 1 << library;
+        if (c.kind == Start) VI_NATIVE(prehandleStart)(env, thiz, jni.string(VI_SOAK_SCENE), c.v[0], c.v[1]);
+        started |= c.kind == Start;
         if (c.kind == Recycle) VI_NATIVE(prehandleRecycleTextures)(env, thiz);
         if (c.kind == Draw) after = frame();
         if (c.kind == Touch) VI_NATIVE(prehandleTouch)(env, thiz, c.v[0], c.v[1], c.v[2]);
-        if (c.kind == Key) vi::Application::handleKey(unsigned(c.v[0]));
         if (c.kind == Param) VI_NATIVE(prehandleParam)(env, thiz, c.v[0], c.v[1]);
         if (c.kind == Orientation) VI_NATIVE(prehandleSetOrientation)(env, thiz, c.v[0]);
         if (c.kind == Image) {  // unloaded when v[3] is 0
@@ -128,11 +124,15 @@ int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
             unloaded += c.v[3] == 0;
         }
         if (c.kind >= Switch && c.kind < Plain) after = atChange = frame();
-        if (c.kind == NoContext) vitest::GlContext::releaseCurrent(), context = None;
-        if (c.kind == Loss) gl.recreate(), context = First;
-        if (c.kind == Switch) context = context == First ? (gl.makeSecondCurrent(), Second) : (gl.makeCurrent(), First);
-        if (!before.empty() && !after.empty() && before != after)  // exit status 3
-            return std::printf("soak: call %d: the frame after a context change differs from the one before\n", i), 3;
+        if (c.kind == NoContext) vitest::GlContext::releaseCurrent();
+        if (c.kind == Loss) gl.recreate();
+        if (c.kind == Switch) context == First ? gl.makeSecondCurrent() : gl.makeCurrent();
+        if (c.kind >= Switch && c.kind < Plain)
+            context = c.kind == NoContext ? None : c.kind == Switch && context == First ? Second : First;
+        if (!before.empty() && !after.empty() && before != after) {
+            std::printf("soak: call %d: the frame after a context change differs from the one before\n", i);
+            return 3;
+        }
     }
     if (context == None) gl.makeCurrent();
     VI_NATIVE(prehandleStop)(env, thiz);  // as a host leaves, so that the leak checker sees what the scene left
@@ -161,8 +161,11 @@ void shrink(std::uint64_t seed, int index, int status) {
         for (int start = 0; start < int(calls.size()) && std::time(nullptr) < deadline; start += chunk) {
             std::vector<int> rest = calls;
             rest.erase(rest.begin() + start, rest.begin() + std::min(start + chunk, int(calls.size())));
-            if (!rest.empty() && ++replays && inChild(seed, index, rest, true) == status)
-                calls = rest, start -= chunk;
+            if (rest.empty()) continue;
+            ++replays;
+            if (inChild(seed, index, rest, true) != status) continue;
+            calls = rest;
+            start -= chunk;
         }
     std::string list;
     for (const int i : calls) list += (list.empty() ? "" : ",") + std::to_string(i);
@@ -175,34 +178,38 @@ void shrink(std::uint64_t seed, int index, int status) {
 // 50th a new wallpaper first (replacing the last), every 70th textures
 // recycled, every 90th a lost context and another frame. What the runtime
 // keeps across cycles (registries, maps, animations, JNI strings and arrays
-// held, misuses) must not grow after the first; LeakSanitizer reports at exit
+// held) must not grow after the first; LeakSanitizer reports at exit
 // whatever else was left, beyond the leaks soak/lsan.supp names.
 int cycles(int count, const char* sample) {
     vitest::GlContext gl(kCanvas, kCanvas);
     vitest::FakeJni jni;
     JNIEnv* const env = jni.env();
-    const jobject thiz = jni.thiz();
+    const jobject thiz = nullptr;
     std::vector<std::size_t> first, last;
     for (int cycle = 0; cycle < count; ++cycle) {
-        std::vector<std::string> names;  // none when the sample did not start: .at(0) below throws
-        jni.stringArrayValues(VI_NATIVE(prehandleStart)(env, thiz, jni.string(sample), 540, 960), names);
+        // None when the sample did not start: .at(0) below throws.
+        const std::vector<std::string> names =
+            jni.stringArrayValues(VI_NATIVE(prehandleStart)(env, thiz, jni.string(sample), 540, 960));
         const std::vector<jint> wallpaper(std::size_t(40 + cycle % 7) * 72, -cycle);
         if (cycle % 50 == 0)
             VI_NATIVE(loadTexture)(env, nullptr, jni.string(names.at(0)), jni.intArray(wallpaper), 40 + cycle % 7, 72);
         VI_NATIVE(prehandleInitEffect)(env, thiz);
         VI_NATIVE(prehandleDraw)(env, thiz);
         if (cycle % 70 == 69) VI_NATIVE(prehandleRecycleTextures)(env, thiz);
-        if (cycle % 90 == 89) gl.recreate(), VI_NATIVE(prehandleDraw)(env, thiz);
+        if (cycle % 90 == 89) {
+            gl.recreate();
+            VI_NATIVE(prehandleDraw)(env, thiz);
+        }
         (cycle % 2 ? VI_NATIVE(prehandlePause) : VI_NATIVE(prehandleStop))(env, thiz);
         jni.reset();
         (cycle ? last : first) = {vi::Renderer::mAllRenderers.size(), vi::Texture::mAllTextures.size(),
                                   vi::ApplicationVar::msTexturesMap.size(), vi::ApplicationVar::msModelsMap.size(),
-                                  vi::AnimationManager::mStorage.size(), std::size_t(jni.outstandingUtfChars()),
-                                  std::size_t(jni.outstandingElements()), jni.misuses().size()};
+                                  vi::AnimationManager::mStorage.size(), std::size_t(jni.outstanding())};
     }
     std::printf("cycles: %d start and stop cycles; what is kept, after the first and the last:", count);
     for (std::size_t k = 0; k < first.size(); ++k) std::printf(" %zu/%zu", first[k], last[k]);
-    return std::printf("; %s\n", first == last ? "nothing grew" : "FAULT: it grew"), first == last ? 0 : 1;
+    std::printf("; %s\n", first == last ? "nothing grew" : "FAULT: it grew");
+    return first == last ? 0 : 1;
 }
 
 }  // namespace
@@ -210,9 +217,13 @@ int cycles(int count, const char* sample) {
 int main(int argc, char** argv) {
     std::map<std::string, std::string> options = {{"--seed", std::to_string(std::random_device()() % 1000000)},
         {"--minutes", "3"}, {"--sequences", "1e9"}, {"--replay", ""}, {"--cycles", "0"}, {"--sample", ""}};
-    for (int i = 1; i < argc; i += 2)
-        if (i + 1 == argc || !options.count(argv[i]) || !(options[argv[i]] = argv[i + 1]).size())
-            return std::fprintf(stderr, "usage: see the top of soak/driver/Soak.cpp\n"), 2;
+    for (int i = 1; i < argc; i += 2) {
+        if (i + 1 == argc || !options.count(argv[i]) || !*argv[i + 1]) {
+            std::fprintf(stderr, "usage: see the top of soak/driver/Soak.cpp\n");
+            return 2;
+        }
+        options[argv[i]] = argv[i + 1];
+    }
     setvbuf(stdout, nullptr, _IOLBF, 0);
     if (std::stoi(options["--cycles"]) > 0) return cycles(std::stoi(options["--cycles"]), options["--sample"].c_str());
     const std::uint64_t seed = std::stoull(options["--seed"]);
@@ -220,18 +231,24 @@ int main(int argc, char** argv) {
     std::vector<int> only;  // SEQUENCE:i,j,k
     for (std::size_t at = replay.find(':'); at != std::string::npos; at = replay.find(',', at + 1))
         only.push_back(std::atoi(replay.c_str() + at + 1));
-    const int replayed = replay.empty() ? 0 : play(seed, std::atoi(replay.c_str()), only, true);  // here
-    if (!replay.empty()) return std::printf("soak: the replay %s\n", replayed ? "failed" : "passed"), replayed;
+    if (!replay.empty()) {
+        const int replayed = play(seed, std::atoi(replay.c_str()), only, true);  // in this process
+        std::printf("soak: the replay %s\n", replayed ? "failed" : "passed");
+        return replayed;
+    }
     const double end = double(std::time(nullptr)) + std::stod(options["--minutes"]) * 60;
-    long played = 0, calls = 0, losses = 0, status = 0;
+    long played = 0, callCount = 0, losses = 0, status = 0;
     for (; !status && played < std::stod(options["--sequences"]) && std::time(nullptr) < end; ++played) {
-        for (const Call& c : sequence(seed, int(played))) ++calls, losses += c.kind == Loss;
-        if ((status = inChild(seed, int(played), {}, false)))
-            std::printf("soak: FAULT with seed %llu in sequence %ld: status %ld%s\n", (unsigned long long)seed, played,
-                        status, status == 128 + SIGALRM ? " (a hang)" : ", see above");
-        if (status) shrink(seed, int(played), int(status));
+        const std::vector<Call> calls = sequence(seed, int(played));
+        callCount += long(calls.size());
+        losses += std::count_if(calls.begin(), calls.end(), [](const Call& c) { return c.kind == Loss; });
+        status = inChild(seed, int(played), {}, false);
+        if (!status) continue;
+        std::printf("soak: FAULT with seed %llu in sequence %ld: status %ld%s\n", (unsigned long long)seed, played,
+                    status, status == 128 + SIGALRM ? " (a hang)" : ", see above");
+        shrink(seed, int(played), int(status));
     }
     std::printf("soak: seed %llu, %ld sequences, %ld calls, %ld context losses, %d faults\n", (unsigned long long)seed,
-                played, calls, losses, status ? 1 : 0);
+                played, callCount, losses, status ? 1 : 0);
     return status ? 1 : 0;
 }

@@ -34,15 +34,15 @@ namespace {
 // with the arguments of a start, a touch, a key and a parameter; then cleared.
 std::string taken() {
     std::string seen;
-    for (int i = 0; i < testSceneEventCount(); ++i) {
-        const TestSceneEvent e = testSceneEventAt(i);
+    for (const TestSceneEvent& e : gTestScene.events) {
         seen += "CDcaltIAFdumkp"[e.kind];
         if (e.kind == TestSceneCreated || e.kind == TestSceneParam || e.kind == TestSceneKeyPressed)
             seen += std::to_string(e.a) + (e.kind == TestSceneKeyPressed ? "" : "," + std::to_string(e.b));
         if (e.kind >= TestSceneTouchDown && e.kind <= TestSceneTouchMove)
             seen += "(" + std::to_string(e.x) + "," + std::to_string(e.y) + ")";
     }
-    return testSceneClearEvents(), seen;
+    gTestScene.clearEvents();
+    return seen;
 }
 
 Ints window() {
@@ -53,18 +53,25 @@ Ints window() {
 // Each call a host may make that must not reach a scene that is not ready.
 void everyEventButInitialisation() {
     EXPECT_EQ(0, App::handleDraw());
-    App::handleClearEffect(), App::handleAffordance(), App::handleUnlock(), App::handleParam(1, 2);
-    App::handleMouseDown(1, 1), App::handleKey(0), App::handleKey('U'), App::handleKey('T');
+    for (void (*event)() : {App::handleClearEffect, App::handleAffordance, App::handleUnlock}) event();
+    App::handleParam(1, 2);
+    App::handleMouseDown(1, 1);
+    for (unsigned key : {0u, unsigned('U'), unsigned('T')}) App::handleKey(key);
 }
 
 class Handlers : public ::testing::Test {
 protected:
     void SetUp() override {
-        App::handleStop(), AnimationManager::mStorage.clear(), testSceneReset(), gCreateScene = createScene;
+        App::handleStop();
+        AnimationManager::mStorage.clear();
+        gTestScene.reset();
+        gCreateScene = createScene;
     }
     void TearDown() override { SetUp(); }
     static void startReady(int l, int t, int w, int h) {
-        App::handleStart(l, t, w, h), App::handleInitEffect(), testSceneClearEvents();
+        App::handleStart(l, t, w, h);
+        App::handleInitEffect();
+        gTestScene.clearEvents();
     }
 };
 
@@ -77,25 +84,40 @@ TEST(DefaultWindow, IsFiveFortyByNineSixtyAtTheOriginAndNormalisesItsCentreToOne
 }
 
 TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
-    const char* names[] = {"sky", "glass"};
-    testSceneSetNames(names, 2), testSceneSetDrawResult(3);
+    gTestScene.names = {"sky", "glass"};
+    gTestScene.drawResult = 3;
     std::vector<std::string>& returned = App::handleStart(5, 7, 0, -3);
     EXPECT_EQ(window(), (Ints{5, 7, 1, 1})) << "clamped to one pixel";
-    EXPECT_TRUE(&returned == &gpScene->mNames && returned == std::vector<std::string>(names, names + 2));
+    EXPECT_TRUE(&returned == &gpScene->mNames && returned == gTestScene.names);
     everyEventButInitialisation();
     EXPECT_EQ(taken(), "C1,1");
-    App::handleInitEffect(), Timer::mStartingCnt = {1, 0}, App::handleInitEffect();  // once, but restarts the clock
+    App::handleInitEffect();
+    Timer::mStartingCnt = {1, 0};
+    App::handleInitEffect();  // initialises once, but restarts the clock
     EXPECT_NE(Timer::mStartingCnt.tv_sec, 1);
     AnimationManager::mNow = -1.0f;
-    App::handleAffordance(), App::handleUnlock(), App::handleParam(-5, 123456789), App::handleKey(1000);
+    for (void (*event)() : {App::handleAffordance, App::handleUnlock}) event();
+    App::handleParam(-5, 123456789);
+    App::handleKey(1000);
+    App::handleMouseMove(5, 7);  // the window's top left corner
     EXPECT_EQ(App::handleDraw(), 3);
-    for (int i = 0; i < testSceneEventCount(); ++i) EXPECT_GE(testSceneEventAt(i).now, 0.0f) << "clock first";
-    EXPECT_EQ(taken(), "Icalp-5,123456789k1000F");
+    for (const TestSceneEvent& e : gTestScene.events) EXPECT_GE(e.now, 0.0f) << "the clock first";
+    EXPECT_EQ(taken(), "Icalp-5,123456789k1000m(0.000000,1.000000)F");
+    // The host moves the window: no lock, and no word to the scene.
+    App::handleWindowRectangle(-3, -4, 0, -20);
+    EXPECT_TRUE(window() == (Ints{-3, -4, 1, 1}) && gpScene->mSize == glm::vec2(1.0f, 1.0f) && taken().empty());
     // A clear restarts the clock after the scene cleared, not before.
-    Timer::mStartingCnt = {1, 0}, AnimationManager::mNow = -1.0f, App::handleClearEffect();
-    EXPECT_TRUE(testSceneEventAt(0).now == -1.0f && Timer::mStartingCnt.tv_sec != 1 && AnimationManager::mNow >= 0.0f);
-    App::handleRestart(), App::handleStart(0, 0, 540, 960), everyEventButInitialisation();  // waits for its init
-    App::handleStop(), everyEventButInitialisation(), App::handleInitEffect();
+    Timer::mStartingCnt = {1, 0};
+    AnimationManager::mNow = -1.0f;
+    App::handleClearEffect();
+    EXPECT_EQ(gTestScene.events.at(0).now, -1.0f);
+    EXPECT_TRUE(Timer::mStartingCnt.tv_sec != 1 && AnimationManager::mNow >= 0.0f);
+    App::handleRestart();
+    App::handleStart(0, 0, 540, 960);
+    everyEventButInitialisation();  // the new scene waits for its initialisation
+    App::handleStop();
+    everyEventButInitialisation();
+    App::handleInitEffect();
     EXPECT_TRUE(taken() == "cDC1,1IDC540,960D" && gpScene == nullptr);
 }
 
@@ -108,48 +130,39 @@ TEST_F(Handlers, EveryNonZeroOrientationIsTheOneAlternateAndWaitsForItsInitialis
     setOrientation(nullptr, nullptr, 7);
     everyEventButInitialisation();
     for (int value : {7, -1, 2, INT_MAX, INT_MIN, 1, 0, INT_MIN}) {
-        App::handleInitEffect(), setOrientation(nullptr, nullptr, value), App::handleDraw();
-        EXPECT_EQ(testSceneEventAt(testSceneEventCount() - 1).orientation, value);
+        App::handleInitEffect();
+        setOrientation(nullptr, nullptr, value);
+        App::handleDraw();
+        EXPECT_EQ(gTestScene.events.back().orientation, value);
     }
     EXPECT_EQ(taken(), "AFFFFFFFF");
 }
 
-TEST_F(Handlers, WindowRectangleIsClampedSilentlyAndTouchesAreNormalisedFromItsCorner) {
-    startReady(30, 40, 200, 100);
-    App::handleWindowRectangle(-3, -4, 0, -20);
-    EXPECT_TRUE(window() == (Ints{-3, -4, 1, 1}) && gpScene->mSize == glm::vec2(200.0f, 100.0f)) << "scene not told";
-    App::handleWindowRectangle(30, 40, 200, 100), AnimationManager::mNow = -7.0f;
-    App::handleMouseDown(80, 65), App::handleMouseMove(130, 90), App::handleMouseUp(30, 140);
-    EXPECT_GE(testSceneEventAt(0).now, 0.0f) << "the clock is advanced first";
-    EXPECT_EQ(taken(), "d(0.250000,0.750000)m(0.500000,0.500000)u(0.000000,0.000000)");
-}
+struct Step : Animation {
+    std::function<void(float)> run;
+    void update(float now) override { run(now); }
+};
 
-TEST(Clock, SecondsAndNanosecondsAreConvertedSeparatelyInSinglePrecision) {
-    // A long run with a negative nanosecond difference: at a million seconds a
-    // float keeps sixteenths, so only the single-precision sum of the two
-    // converted differences comes out exactly.
-    Timer::restart(), Timer::mStartingCnt = {Timer::mStartingCnt.tv_sec - 1000003, 999999999}, Timer::update();
-    const float seconds = float(std::int32_t(Timer::mCurrentCnt.tv_sec - Timer::mStartingCnt.tv_sec));
-    EXPECT_EQ(AnimationManager::mNow, float(std::int32_t(Timer::mCurrentCnt.tv_nsec - 999999999)) * 1e-9f + seconds);
-    EXPECT_NEAR(AnimationManager::mNow, seconds - 1.0 + Timer::mCurrentCnt.tv_nsec * 1e-9, 0.07);
-}
-
-struct Step : Animation { std::function<void(float)> run; void update(float now) override { run(now); } };
-
-TEST_F(Handlers, AReadyFrameUpdatesTheAnimationsInOrderWithTheClockReadAfreshBeforeTheScene) {
-    std::string order;
+// The animations of a ready frame run in storage order after the clock is
+// advanced and before the scene draws, each given the clock as it is then (an
+// update may move it); one added by an update waits for the next frame.
+TEST_F(Handlers, AReadyFrameUpdatesTheAnimationsInOrderBeforeTheScene) {
     std::vector<float> times;
-    Step first, second, third, late;
-    // The first moves the clock, the second adds one that waits for the next frame.
-    first.run = [&](float now) { order += '1', times.push_back(now), AnimationManager::mNow += 100.0f; };
-    second.run = [&](float now) { order += '2', times.push_back(now), AnimationManager::mStorage.push_back(&late); };
-    third.run = [&](float now) { order += '3', times.push_back(now); };
-    late.run = [&](float) { order += '4'; };
-    AnimationManager::mStorage = {&first, &second, &third};
-    App::handleStart(0, 0, 540, 960), App::handleDraw(), App::handleInitEffect(), App::handleDraw();
-    EXPECT_TRUE(times.at(0) >= 0 && times[0] < 100 && times.at(1) == times[0] + 100 && times.at(2) == times[1]);
-    EXPECT_EQ(testSceneEventAt(testSceneEventCount() - 1).now, times[2]) << "the scene draws after them";
-    EXPECT_EQ((App::handleDraw(), order), "1231234");
+    Step first, second, late;
+    first.run = [&](float now) {
+        times.push_back(now);
+        AnimationManager::mNow += 100.0f;
+        AnimationManager::mStorage.push_back(&late);
+    };
+    second.run = late.run = [&](float now) { times.push_back(now); };
+    AnimationManager::mStorage = {&first, &second};
+    startReady(0, 0, 540, 960);
+    AnimationManager::mNow = -1.0f;
+    App::handleDraw();
+    ASSERT_EQ(times.size(), 2u);
+    EXPECT_TRUE(times[0] >= 0.0f && times[1] == times[0] + 100.0f && gTestScene.events.back().now == times[1]);
+    App::handleDraw();
+    EXPECT_EQ(times.size(), 5u);
 }
 
 TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
@@ -164,7 +177,8 @@ TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
                              // the host's keys, and the developer keys that stay under the lock
                              run([](int i) { App::handleKey(Ints{0, 1, 2, 'A', 'U'}[i % 5]); })};
     for (std::thread& thread : threads) thread.join();
-    EXPECT_TRUE(testSceneOverlaps() == 0 && testSceneEventCount() == 5 * kCalls) << "one event a call, 'A' too";
+    EXPECT_EQ(gTestScene.overlaps, 0);
+    EXPECT_EQ(gTestScene.events.size(), std::size_t(5 * kCalls)) << "one event a call, 'A' too";
 }
 
 // The key 'C' takes the lock the key handler already holds: the thread never
@@ -202,28 +216,41 @@ struct SelfTestSteps {
                         std::to_string(1.0f - float(int(ry % height)) / float(height)) + ")F");
     }
     void orientationRestarts() {
-        for (unsigned i = 0, n = count(); i < n; ++i) seen += started() + (i & 1 ? "AF" : "F");
+        const unsigned n = count();
+        for (unsigned i = 0; i < n; ++i) seen += started() + (i & 1 ? "AF" : "F");
     }
+    // With a shared counter the moves advance the phase's own counter.
     void gestures(bool sharedCounter) {
-        unsigned i = 0, n = count();
-        for (unsigned gesture = 0; sharedCounter ? i < n : gesture < n; ++gesture, ++i) {
+        const unsigned n = count();
+        unsigned i = 0;
+        for (unsigned gesture = 0; sharedCounter ? i < n : gesture < n; ++gesture) {
             touch('d');
             const unsigned m = count();
-            for (unsigned move = 0; sharedCounter ? i < m : move < m; ++move, i += sharedCounter) touch('m');
+            for (unsigned move = 0; sharedCounter ? i < m : move < m; ++move) {
+                touch('m');
+                i += sharedCounter;
+            }
             touch('u');
+            ++i;
         }
     }
     void windowRectangles() {
-        for (unsigned pass = 0, n = count(); pass < n; ++pass) {
+        const unsigned n = count();
+        for (unsigned pass = 0; pass < n; ++pass) {
             seen += started() + "F";
-            left = int(lrand48() % 1080), top = int(lrand48() % 1920);
-            width = std::max(1, int(lrand48() % 1080)), height = std::max(1, int(lrand48() % 1920));
+            left = int(lrand48() % 1080);
+            top = int(lrand48() % 1920);
+            width = std::max(1, int(lrand48() % 1080));
+            height = std::max(1, int(lrand48() % 1920));
         }
     }
     void run() {
-        orientationRestarts(), gestures(true);
+        orientationRestarts();
+        gestures(true);
         const long third = lrand48() % 3;
-        third == 0 ? orientationRestarts() : third == 1 ? gestures(false) : windowRectangles();
+        if (third == 0) orientationRestarts();
+        if (third == 1) gestures(false);
+        if (third == 2) windowRectangles();
     }
 };
 
@@ -238,11 +265,13 @@ TEST_F(Handlers, SelfTestKeyRunsEveryStepOfItsRandomSequence) {
         SCOPED_TRACE(testing::Message() << "seed " << seed);
         startReady(10, 20, 300, 500);
         SelfTestSteps steps = {10, 20, 300, 500, ""};
-        srand48(seed), steps.run();
+        srand48(seed);
+        steps.run();
         const long next = lrand48();
-        srand48(seed), App::handleKey('T');
+        srand48(seed);
+        App::handleKey('T');
         EXPECT_EQ(lrand48(), next) << "the random numbers drawn";
         EXPECT_TRUE(taken() == steps.seen) << "the scene's record differs from the steps";
-        EXPECT_TRUE(window() == (Ints{steps.left, steps.top, steps.width, steps.height}) && !testSceneOverlaps());
+        EXPECT_TRUE(window() == (Ints{steps.left, steps.top, steps.width, steps.height}) && !gTestScene.overlaps);
     }
 }

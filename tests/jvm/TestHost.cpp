@@ -1,6 +1,6 @@
 // What NativeTest needs besides the host's entry points: a headless GL
 // context current on the calling Java thread (as the host's render thread has
-// one), a pixel of its framebuffer and the loader's pending error.
+// one) and the loader's pending error.
 #include <dlfcn.h>
 #include <jni.h>
 
@@ -11,10 +11,6 @@ extern "C" {
 JNIEXPORT void JNICALL Java_com_tarq_test_NativeTest_makeContextCurrent(JNIEnv*, jclass) {
     static vitest::GlContext* context = new vitest::GlContext(64, 64);
     context->makeCurrent();
-}
-
-JNIEXPORT jint JNICALL Java_com_tarq_test_NativeTest_readPixel(JNIEnv*, jclass, jint x, jint y) {
-    return jint(vitest::readPixel(x, y));
 }
 
 JNIEXPORT jstring JNICALL Java_com_tarq_test_NativeTest_loaderError(JNIEnv* env, jclass) {

@@ -7,7 +7,6 @@
 #include <GLES2/gl2.h>
 #include <jni.h>
 
-#include <algorithm>
 #include <atomic>
 #include <thread>
 
@@ -18,25 +17,23 @@
 #include "Render/Texture.h"
 #include "TestSceneRecord.h"
 
+TestSceneState gTestScene;
+
 namespace {
 
-struct Config {
-    std::vector<std::string> names;
-    int drawResult = 0;
-    bool clear = false, picture = false;
-    float clearColour[4] = {};
-} gConfig;
-std::vector<TestSceneEvent> gEvents;
-int gSerial = 0;
-std::atomic<int> gInside(0), gOverlaps(0);
+std::atomic<int> gInside(0);
 
 class RecordingScene : public vi::Scene {
 public:
     RecordingScene(const int* size, vi::TexturesMap* textures, int factory)
-        : vi::Scene(size), mSerial(++gSerial), mFactory(factory), mTextures(textures) {
-        mNames = gConfig.names, note(TestSceneCreated, size[0], size[1]);
+        : vi::Scene(size), mFactory(factory), mTextures(textures) {
+        mNames = gTestScene.names;
+        note(TestSceneCreated, size[0], size[1]);
     }
-    ~RecordingScene() override { note(TestSceneDestroyed), delete mPicture; }
+    ~RecordingScene() override {
+        note(TestSceneDestroyed);
+        delete mPicture;
+    }
 
     void clearEffect() override { note(TestSceneClearEffect); }
     void affordance() override { note(TestSceneAffordance); }
@@ -51,30 +48,33 @@ public:
     void param(int a, int b) override { note(TestSceneParam, a, b); }
     int draw() override {
         note(TestSceneDraw);
-        const float* c = gConfig.clearColour;
-        if (gConfig.clear) glClearColor(c[0], c[1], c[2], c[3]), glClear(GL_COLOR_BUFFER_BIT);
+        const float* c = gTestScene.clearColour;
+        if (gTestScene.clear) {
+            glClearColor(c[0], c[1], c[2], c[3]);
+            glClear(GL_COLOR_BUFFER_BIT);
+        }
         // The picture is made in the first frame with a context and the image
         // filed, so that its GL names come from a frame the runtime checked
         // the context for; left out while the image has no client pixels
         // (recycled, it may come back from a lost context undefined).
         auto filed = mNames.empty() ? mTextures->end() : mTextures->find(mNames[0]);
-        if (gConfig.picture && !mPicture && filed != mTextures->end() && filed->second && eglGetCurrentContext())
+        if (gTestScene.picture && !mPicture && filed != mTextures->end() && filed->second && eglGetCurrentContext())
             mPicture = new vi::Background(*filed->second);
-        if (gConfig.picture && mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
-        return gConfig.drawResult;
+        if (gTestScene.picture && mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
+        return gTestScene.drawResult;
     }
 
 private:
     // Gives up the processor once inside, so that a call let in without the
     // lock finds the flag set.
     void note(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
-        if (gInside.exchange(1)) ++gOverlaps;
+        if (gInside.exchange(1)) ++gTestScene.overlaps;
         std::this_thread::yield();
-        gEvents.push_back({kind, mSerial, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});
+        gTestScene.events.push_back({kind, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});
         gInside.store(0);
     }
 
-    int mSerial, mFactory;
+    int mFactory;
     vi::TexturesMap* mTextures;
     vi::Background* mPicture = nullptr;
 };
@@ -83,62 +83,45 @@ private:
 
 extern "C" {
 
-TESTSCENE_API vi::Scene* createScene(int* s, vi::ModelsMap*, vi::TexturesMap* t) { return new RecordingScene(s, t, 1); }
+JNIEXPORT vi::Scene* createScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
+    return new RecordingScene(size, textures, 1);
+}
 // Not looked up by the runtime: a test puts it into vi::gCreateScene to tell
 // which factory made a scene.
-TESTSCENE_API vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
+JNIEXPORT vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMap* textures) {
     return new RecordingScene(size, textures, 2);
 }
 
-void testSceneClearEvents(void) { gEvents.clear(), gOverlaps = 0; }
-void testSceneReset(void) { testSceneClearEvents(), gConfig = Config(), gSerial = 0; }
-void testSceneSetNames(const char* const* names, int count) { gConfig.names.assign(names, names + count); }
-void testSceneSetDrawResult(int result) { gConfig.drawResult = result; }
-void testSceneSetClearColour(int on, float red, float green, float blue, float alpha) {
-    gConfig = {gConfig.names, gConfig.drawResult, on != 0, gConfig.picture, {red, green, blue, alpha}};
-}
-void testSceneSetPicture(int enabled) { gConfig.picture = enabled != 0; }
-int testSceneEventCount(void) { return int(gEvents.size()); }
-TestSceneEvent testSceneEventAt(int index) { return gEvents.at(std::size_t(index)); }
-int testSceneOverlaps(void) { return gOverlaps; }
-
 #define TESTSCENE_NATIVE(method) Java_com_tarq_test_TestScene_##method
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(reset)(JNIEnv*, jclass) { testSceneReset(); }
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(reset)(JNIEnv*, jclass) { gTestScene.reset(); }
 
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectArray names) {
-    gConfig.names.clear();
+    gTestScene.names.clear();
     for (jsize i = 0; i < env->GetArrayLength(names); ++i) {
         jstring name = static_cast<jstring>(env->GetObjectArrayElement(names, i));
         const char* chars = env->GetStringUTFChars(name, nullptr);
-        gConfig.names.push_back(chars);
-        env->ReleaseStringUTFChars(name, chars), env->DeleteLocalRef(name);
+        gTestScene.names.push_back(chars);
+        env->ReleaseStringUTFChars(name, chars);
+        env->DeleteLocalRef(name);
     }
 }
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint result) { gConfig.drawResult = result; }
-
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setClearColour)(JNIEnv*, jclass, jboolean on, jfloat r, jfloat g, jfloat b,
-                                                         jfloat a) {
-    testSceneSetClearColour(on, r, g, b, a);
-}
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint result) { gTestScene.drawResult = result; }
 
 // Makes the runtime's next start use createSecondScene, as long as it does not
 // look the factory up again.
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(useSecondFactory)(JNIEnv*, jclass) { vi::gCreateScene = createSecondScene; }
 
-JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return testSceneEventCount(); }
+JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return jint(gTestScene.events.size()); }
 
-JNIEXPORT jint JNICALL TESTSCENE_NATIVE(count)(JNIEnv*, jclass, jint kind) {
-    return jint(std::count_if(gEvents.begin(), gEvents.end(), [kind](const auto& e) { return e.kind == kind; }));
-}
-
-// kind, scene, factory, a, b
+// kind, factory, a, b
 JNIEXPORT jintArray JNICALL TESTSCENE_NATIVE(eventInts)(JNIEnv* env, jclass, jint index) {
-    const TestSceneEvent& e = gEvents.at(std::size_t(index));
-    const jint values[] = {e.kind, e.scene, e.factory, e.a, e.b};
-    jintArray array = env->NewIntArray(5);
-    return env->SetIntArrayRegion(array, 0, 5, values), array;
+    const TestSceneEvent& e = gTestScene.events.at(std::size_t(index));
+    const jint values[] = {e.kind, e.factory, e.a, e.b};
+    jintArray array = env->NewIntArray(4);
+    env->SetIntArrayRegion(array, 0, 4, values);
+    return array;
 }
 
 }  // extern "C"

@@ -1,6 +1,5 @@
 #include "FakeJni.h"
 
-#include <algorithm>
 #include <cstring>
 
 namespace vitest {
@@ -8,20 +7,17 @@ namespace vitest {
 FakeJni::FakeJni() {
     std::memset(&mTable, 0, sizeof(mTable));
     mTable.reserved0 = this;
-    mTable.GetStringUTFChars = [](JNIEnv* env, jstring string, jboolean* isCopy) -> const char* {
-        return self(env).lend<char>(self(env).mUtfChars, string, &Object::text, isCopy);
+    mTable.GetStringUTFChars = [](JNIEnv* env, jstring string, jboolean*) {
+        const std::string& text = self(env).find(string)->text;
+        return static_cast<const char*>(self(env).lend(text.data(), text.size()));
     };
-    mTable.ReleaseStringUTFChars = [](JNIEnv* env, jstring string, const char* chars) {
-        if (self(env).giveBack(self(env).mUtfChars, chars, string, "ReleaseStringUTFChars")) delete[] chars;
+    mTable.ReleaseStringUTFChars = [](JNIEnv* env, jstring, const char* chars) { self(env).mLeases.erase(chars); };
+    mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean*) {
+        const std::vector<jint>& ints = self(env).find(array)->ints;
+        return static_cast<jint*>(self(env).lend(ints.data(), ints.size() * sizeof(jint)));
     };
-    mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean* isCopy) {
-        return self(env).lend<jint>(self(env).mElements, array, &Object::ints, isCopy);
-    };
-    // Every mode as 0, the one the runtime uses: written back and released.
-    mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray array, jint* elements, jint) {
-        if (!self(env).giveBack(self(env).mElements, elements, array, "ReleaseIntArrayElements")) return;
-        std::copy(elements, elements + self(env).find(array)->ints.size(), self(env).find(array)->ints.begin());
-        delete[] elements;
+    mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray, jint* elements, jint) {
+        self(env).mLeases.erase(elements);
     };
     mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(name, {})); };
     mTable.NewStringUTF = [](JNIEnv* env, const char* chars) { return self(env).string(chars); };
@@ -36,40 +32,31 @@ FakeJni::FakeJni() {
     mEnv.functions = &mTable;
 }
 
-// A copy of the object's items (one more, zeroed: a string's terminator, and
-// never an empty lease), noted as handed out.
-template <typename T, typename Items>
-T* FakeJni::lend(Leases& leases, const void* handle, Items Object::*items, jboolean* isCopy) {
-    const Items& from = find(handle)->*items;
-    T* copy = new T[from.size() + 1]();
-    std::copy(from.begin(), from.end(), copy);
-    if (isCopy) *isCopy = JNI_TRUE;
-    return leases[copy] = find(handle), copy;
+FakeJni::Object* FakeJni::make(const std::string& text, const std::vector<jint>& ints) {
+    mObjects.emplace_back(new Object{text, ints, {}});
+    return mObjects.back().get();
 }
 
-bool FakeJni::giveBack(Leases& leases, const void* copy, const void* owner, const char* what) {
-    auto held = leases.find(copy);
-    if (held == leases.end() || held->second != owner)
-        return mMisuses.push_back(std::string(what) + " of something not handed out for that object"), false;
-    leases.erase(held);
-    return true;
+FakeJni::Object* FakeJni::find(const void* handle) const {
+    for (const std::unique_ptr<Object>& owned : mObjects)
+        if (owned.get() == handle) return owned.get();
+    return nullptr;
 }
 
-bool FakeJni::stringArrayValues(jobjectArray array, std::vector<std::string>& values) const {
-    Object* found = find(array);
-    if (!found || found->text != "java/lang/String") return false;
-    values.clear();
-    for (Object* element : found->objects) values.push_back(element ? element->text : "(null)");
-    return std::count(found->objects.begin(), found->objects.end(), nullptr) == 0;
+void* FakeJni::lend(const void* bytes, std::size_t size) {
+    std::unique_ptr<std::string> copy(new std::string(static_cast<const char*>(bytes), size));
+    copy->push_back('\0');
+    void* address = &(*copy)[0];
+    mLeases[address] = std::move(copy);
+    return address;
 }
 
-// Objects with elements still handed out stay, so that a late release finds
-// its owner; only the handles die, as local references do.
-void FakeJni::reset() {
-    auto leased = [this](const std::unique_ptr<Object>& owned) {
-        return std::any_of(mElements.begin(), mElements.end(), [&](const auto& l) { return l.second == owned.get(); });
-    };
-    mObjects.erase(std::stable_partition(mObjects.begin(), mObjects.end(), leased), mObjects.end());
+std::vector<std::string> FakeJni::stringArrayValues(jobjectArray array) const {
+    std::vector<std::string> values;
+    const Object* found = find(array);
+    if (found && found->text == "java/lang/String")
+        for (const Object* element : found->objects) values.push_back(element->text);
+    return values;
 }
 
 }  // namespace vitest

@@ -4,9 +4,7 @@
 // C++ as the host's Java side would. Only what those entry points call is
 // filled in (strings, int arrays, String arrays); every other slot is null,
 // so an unexpected JNI call crashes at once. Like a JVM it hands out copies
-// (made with new[], never malloc, so that a binary wrapping free sees only the
-// runtime's frees), writes int elements back on release with mode 0 or
-// JNI_COMMIT, counts what was handed out and not given back, and notes misuse.
+// of string chars and array elements and counts those not given back.
 // Objects live until reset(), as local references live until the native
 // method returns.
 
@@ -28,7 +26,7 @@ VI_NATIVE_PLAIN(prehandlePause) VI_NATIVE_PLAIN(prehandleDraw) VI_NATIVE_PLAIN(p
 VI_NATIVE_PLAIN(prehandleVolumeUpPressed) VI_NATIVE_PLAIN(prehandleVolumeDownPressed)
 VI_NATIVE_PLAIN(prehandleClearEffect) VI_NATIVE_PLAIN(prehandleAffordance) VI_NATIVE_PLAIN(prehandleUnlock)
 jobjectArray VI_NATIVE(prehandleStart)(JNIEnv*, jobject, jstring, jint, jint);
-void VI_NATIVE(prehandleRecycleTextures)(JNIEnv*, jobject), VI_NATIVE(loadModel)(JNIEnv*, jobject, jstring);
+void VI_NATIVE(prehandleRecycleTextures)(JNIEnv*, jobject);
 void VI_NATIVE(prehandleTouch)(JNIEnv*, jobject, jint, jint, jint);
 jint VI_NATIVE(prehandleParam)(JNIEnv*, jobject, jint, jint);
 jint VI_NATIVE(prehandleSetOrientation)(JNIEnv*, jobject, jint);
@@ -40,31 +38,19 @@ namespace vitest {
 class FakeJni {
 public:
     FakeJni();
-    ~FakeJni() {
-        for (const auto& lease : mUtfChars) delete[] static_cast<const char*>(lease.first);
-        for (const auto& lease : mElements) delete[] static_cast<const jint*>(lease.first);
-    }
     FakeJni(const FakeJni&) = delete;
     FakeJni& operator=(const FakeJni&) = delete;
 
     JNIEnv* env() { return &mEnv; }
-    jobject thiz() { return reinterpret_cast<jobject>(this); }
     // Java-side values, alive until reset().
     jstring string(const std::string& text) { return reinterpret_cast<jstring>(make(text, {})); }
     jintArray intArray(const std::vector<jint>& values) { return reinterpret_cast<jintArray>(make("", values)); }
-    // The elements of a String[] the runtime made, or false if `array` is not one.
-    bool stringArrayValues(jobjectArray array, std::vector<std::string>& values) const;
-
-    // Handed out and not given back.
-    int outstandingUtfChars() const { return int(mUtfChars.size()); }
-    int outstandingElements() const { return int(mElements.size()); }
-    // Forgets outstanding UTF chars without deleting them, as a JVM whose
-    // caller never releases them would: a leak checker then sees them.
-    void forgetOutstandingUtfChars() { mUtfChars.clear(); }
-    // Releases of something not handed out, and the like.
-    const std::vector<std::string>& misuses() const { return mMisuses; }
+    // The elements of a String[] the runtime made; none if `array` is not one.
+    std::vector<std::string> stringArrayValues(jobjectArray array) const;
+    // String chars and array elements handed out and not given back.
+    int outstanding() const { return int(mLeases.size()); }
     // Ends the "native call": local references die.
-    void reset();
+    void reset() { mObjects.clear(); }
 
 private:
     struct Object {
@@ -72,28 +58,19 @@ private:
         std::vector<jint> ints;        // an int array
         std::vector<Object*> objects;  // an object array
     };
-    using Leases = std::map<const void*, Object*>;  // copies handed out, and whose
 
     static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
-    Object* make(const std::string& text, const std::vector<jint>& ints) {
-        mObjects.emplace_back(new Object{text, ints, {}});
-        return mObjects.back().get();
-    }
+    Object* make(const std::string& text, const std::vector<jint>& ints);
     // Any handle not made here is null: a JNI call on it then crashes at once.
-    Object* find(const void* handle) const {
-        for (const std::unique_ptr<Object>& owned : mObjects)
-            if (owned.get() == handle) return owned.get();
-        return nullptr;
-    }
-    template <typename T, typename Items>
-    T* lend(Leases& leases, const void* handle, Items Object::*items, jboolean* isCopy);
-    bool giveBack(Leases& leases, const void* copy, const void* owner, const char* what);
+    Object* find(const void* handle) const;
+    // A copy of `size` bytes with a zero after them (a string's terminator),
+    // noted as handed out.
+    void* lend(const void* bytes, std::size_t size);
 
     JNINativeInterface_ mTable;
     JNIEnv mEnv;
     std::vector<std::unique_ptr<Object>> mObjects;
-    Leases mUtfChars, mElements;
-    std::vector<std::string> mMisuses;
+    std::map<const void*, std::unique_ptr<std::string>> mLeases;  // by the address handed out
 };
 
 }  // namespace vitest
