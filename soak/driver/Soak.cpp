@@ -39,12 +39,17 @@ enum Kind { Start, Recycle, Draw, Touch, Param, Orientation, Image, Switch, Loss
 // and input most, as with a real host), the entry point of those that take no
 // argument, and the range of each argument of the others.
 using Range = std::pair<int, int>;
-struct KindInfo { const char* name; int weight; jint (*entry)(JNIEnv*, jobject); std::vector<Range> ranges; };
+struct KindInfo {
+    const char* name;
+    int weight;
+    jint (*entry)(JNIEnv*, jobject);
+    std::vector<Range> ranges;
+};
 const KindInfo kKinds[] = {
     {"start", 4, nullptr, {{-40, 1200}, {-40, 2000}}}, {"recycleTextures", 2, nullptr, {}},
     {"draw", 33, nullptr, {}}, {"touch", 10, nullptr, {{-100, 1200}, {-100, 2000}, {-1, 3}}},
     {"param", 4, nullptr, {{-1000, 1000}, {-1000, 1000}}}, {"setOrientation", 3, nullptr, {{-1, 2}}},
-    {"loadTexture", 10, nullptr, {{0, 9}, {0, 3}, {0, 39}, {0, 5}}}, {"contextSwitch", 3, nullptr, {}},
+    {"loadTexture", 10, nullptr, {{0, 9}, {0, 3}, {0, 39}}}, {"contextSwitch", 3, nullptr, {}},
     {"contextLoss", 3, nullptr, {}}, {"contextNone", 2, nullptr, {}},
     {"initEffect", 12, VI_NATIVE(prehandleInitEffect), {}}, {"restart", 3, VI_NATIVE(prehandleRestart), {}},
     {"stop", 2, VI_NATIVE(prehandleStop), {}}, {"menu", 1, VI_NATIVE(prehandleMenuPressed), {}},
@@ -52,7 +57,10 @@ const KindInfo kKinds[] = {
     {"volumeDown", 1, VI_NATIVE(prehandleVolumeDownPressed), {}}, {"affordance", 2, VI_NATIVE(prehandleAffordance), {}},
     {"clearEffect", 2, VI_NATIVE(prehandleClearEffect), {}}};
 
-struct Call { int kind, v[4]; };
+struct Call {
+    int kind;
+    int v[4];
+};
 
 // Sequence `index` of `seed`, made in full from the two numbers.
 std::vector<Call> sequence(std::uint64_t seed, int index) {
@@ -75,7 +83,7 @@ std::vector<Call> sequence(std::uint64_t seed, int index) {
 // Java side would: through the JNI entry points, on the thread that owns the
 // GL context. It knows only what a host knows of its own calls, to skip those
 // a host does not make: a restart before a start, images with no context
-// current, a name loaded again once unloaded, the scene's picture unloaded. So any part of a
+// current. So any part of a
 // sequence is one a host may play, which shrinking relies on. The exit status.
 int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
     const std::vector<Call> calls = sequence(seed, index);
@@ -87,41 +95,37 @@ int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
     vitest::GlContext gl(kCanvas, kCanvas);
     vitest::FakeJni jni;
     JNIEnv* const env = jni.env();
-    const jobject thiz = nullptr;  // the runtime's entry points never read it
     gTestScene.names = {"picture"};  // the scene shows the image filed under its first name
     gTestScene.drawResult = kDrawn;
-    gTestScene.clear = true;  // so that every frame it draws is defined
-    gTestScene.picture = true;
+    gTestScene.picture = true;  // over a cleared frame: every frame it draws is defined
     enum { First, Second, None } context = First;
     bool started = false;
-    int unloaded = 0;                    // names unloaded
     std::vector<std::uint8_t> atChange;  // the frame drawn in the last call, when it changed the context
     auto frame = [&] {  // read back; nothing when the scene drew none or no context is current
-        const bool drawn = VI_NATIVE(prehandleDraw)(env, thiz) == kDrawn && context != None;
+        const bool drawn = VI_NATIVE(prehandleDraw)(env, nullptr) == kDrawn && context != None;
         return drawn ? vitest::readPixels(0, 0, kCanvas, kCanvas) : std::vector<std::uint8_t>();
     };
     for (const int i : only) {
         const Call& c = calls.at(std::size_t(i));
         const int w = c.v[2] == 39 ? 1080 : c.v[2] % 13 * 5, h = c.v[2] == 39 ? 1920 : c.v[2] % 9 * 7;
-        const std::string image = c.v[0] < 6 ? "picture" : "image-" + std::to_string(unloaded);
-        if ((c.kind == Restart && !started) || (c.kind == Image && (context == None || (!c.v[3] && image == "picture"))))
+        const std::string image = c.v[0] < 6 ? "picture" : "image";
+        if ((c.kind == Restart && !started) || (c.kind == Image && context == None))
             continue;
         if (verbose) std::printf("  %3d: %s %d %d %d %d\n", i, kKinds[c.kind].name, c.v[0], c.v[1], c.v[2], c.v[3]);
         jni.reset();
         std::vector<std::uint8_t> before = std::exchange(atChange, {}), after;
-        if (c.kind >= Plain) kKinds[c.kind].entry(env, thiz);
-        if (c.kind == Start) VI_NATIVE(prehandleStart)(env, thiz, jni.string(VI_SOAK_SCENE), c.v[0], c.v[1]);
+        if (c.kind >= Plain) kKinds[c.kind].entry(env, nullptr);
+        if (c.kind == Start) VI_NATIVE(prehandleStart)(env, nullptr, jni.string(VI_SOAK_SCENE), c.v[0], c.v[1]);
         started |= c.kind == Start;
-        if (c.kind == Recycle) VI_NATIVE(prehandleRecycleTextures)(env, thiz);
+        if (c.kind == Recycle) VI_NATIVE(prehandleRecycleTextures)(env, nullptr);
         if (c.kind == Draw) after = frame();
-        if (c.kind == Touch) VI_NATIVE(prehandleTouch)(env, thiz, c.v[0], c.v[1], c.v[2]);
-        if (c.kind == Param) VI_NATIVE(prehandleParam)(env, thiz, c.v[0], c.v[1]);
-        if (c.kind == Orientation) VI_NATIVE(prehandleSetOrientation)(env, thiz, c.v[0]);
-        if (c.kind == Image) {  // unloaded when v[3] is 0
+        if (c.kind == Touch) VI_NATIVE(prehandleTouch)(env, nullptr, c.v[0], c.v[1], c.v[2]);
+        if (c.kind == Param) VI_NATIVE(prehandleParam)(env, nullptr, c.v[0], c.v[1]);
+        if (c.kind == Orientation) VI_NATIVE(prehandleSetOrientation)(env, nullptr, c.v[0]);
+        if (c.kind == Image) {
             std::vector<jint> pixels(std::size_t(w * h));
             std::iota(pixels.begin(), pixels.end(), jint(0xFF102030u - (unsigned(c.v[1]) << 20)));
-            VI_NATIVE(loadTexture)(env, nullptr, jni.string(image), c.v[3] ? jni.intArray(pixels) : nullptr, w, h);
-            unloaded += c.v[3] == 0;
+            VI_NATIVE(loadTexture)(env, nullptr, jni.string(image), jni.intArray(pixels), w, h);
         }
         if (c.kind >= Switch && c.kind < Plain) after = atChange = frame();
         if (c.kind == NoContext) vitest::GlContext::releaseCurrent();
@@ -135,7 +139,7 @@ int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
         }
     }
     if (context == None) gl.makeCurrent();
-    VI_NATIVE(prehandleStop)(env, thiz);  // as a host leaves, so that the leak checker sees what the scene left
+    VI_NATIVE(prehandleStop)(env, nullptr);  // as a host leaves, so that the leak checker sees what the scene left
     return 0;
 }
 
@@ -184,23 +188,24 @@ int cycles(int count, const char* sample) {
     vitest::GlContext gl(kCanvas, kCanvas);
     vitest::FakeJni jni;
     JNIEnv* const env = jni.env();
-    const jobject thiz = nullptr;
     std::vector<std::size_t> first, last;
     for (int cycle = 0; cycle < count; ++cycle) {
-        // None when the sample did not start: .at(0) below throws.
-        const std::vector<std::string> names =
-            jni.stringArrayValues(VI_NATIVE(prehandleStart)(env, thiz, jni.string(sample), 540, 960));
+        if (!VI_NATIVE(prehandleStart)(env, nullptr, jni.string(sample), 540, 960)) {
+            std::printf("cycles: FAULT: cycle %d: the sample did not start\n", cycle);
+            return 1;
+        }
+        // The sample's first name: the image it draws under the water.
         const std::vector<jint> wallpaper(std::size_t(40 + cycle % 7) * 72, -cycle);
         if (cycle % 50 == 0)
-            VI_NATIVE(loadTexture)(env, nullptr, jni.string(names.at(0)), jni.intArray(wallpaper), 40 + cycle % 7, 72);
-        VI_NATIVE(prehandleInitEffect)(env, thiz);
-        VI_NATIVE(prehandleDraw)(env, thiz);
-        if (cycle % 70 == 69) VI_NATIVE(prehandleRecycleTextures)(env, thiz);
+            VI_NATIVE(loadTexture)(env, nullptr, jni.string("wallpaper"), jni.intArray(wallpaper), 40 + cycle % 7, 72);
+        VI_NATIVE(prehandleInitEffect)(env, nullptr);
+        VI_NATIVE(prehandleDraw)(env, nullptr);
+        if (cycle % 70 == 69) VI_NATIVE(prehandleRecycleTextures)(env, nullptr);
         if (cycle % 90 == 89) {
             gl.recreate();
-            VI_NATIVE(prehandleDraw)(env, thiz);
+            VI_NATIVE(prehandleDraw)(env, nullptr);
         }
-        (cycle % 2 ? VI_NATIVE(prehandlePause) : VI_NATIVE(prehandleStop))(env, thiz);
+        (cycle % 2 ? VI_NATIVE(prehandlePause) : VI_NATIVE(prehandleStop))(env, nullptr);
         jni.reset();
         (cycle ? last : first) = {vi::Renderer::mAllRenderers.size(), vi::Texture::mAllTextures.size(),
                                   vi::ApplicationVar::msTexturesMap.size(), vi::ApplicationVar::msModelsMap.size(),

@@ -1,6 +1,6 @@
 // The application handlers as a host and an effect see them, driven from C++
 // with the recording test scene: the lifecycle, what reaches a scene and
-// when, the window and touches, the clock and animations, the keys, and the
+// when, the window and touches, the clock, the keys, and the
 // lock around the scene on many threads (also run under ThreadSanitizer).
 #include <gtest/gtest.h>
 #include <poll.h>
@@ -19,7 +19,6 @@
 #include "Application/Timer.h"
 #include "TestSceneRecord.h"
 
-extern "C" vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);
 // The host's entry point, called as the JVM would (it reads neither argument).
 extern "C" int Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(void*, void*, int);
 const auto setOrientation = Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation;
@@ -29,21 +28,6 @@ using App = vi::Application;
 using Ints = std::vector<int>;
 
 namespace {
-
-// The record so far, one letter per event in the order of TestSceneEventKind,
-// with the arguments of a start, a touch, a key and a parameter; then cleared.
-std::string taken() {
-    std::string seen;
-    for (const TestSceneEvent& e : gTestScene.events) {
-        seen += "CDcaltIAFdumkp"[e.kind];
-        if (e.kind == TestSceneCreated || e.kind == TestSceneParam || e.kind == TestSceneKeyPressed)
-            seen += std::to_string(e.a) + (e.kind == TestSceneKeyPressed ? "" : "," + std::to_string(e.b));
-        if (e.kind >= TestSceneTouchDown && e.kind <= TestSceneTouchMove)
-            seen += "(" + std::to_string(e.x) + "," + std::to_string(e.y) + ")";
-    }
-    gTestScene.clearEvents();
-    return seen;
-}
 
 Ints window() {
     return {ApplicationVar::msWindowLeft, ApplicationVar::msWindowTop, ApplicationVar::msWindowWidth,
@@ -74,133 +58,6 @@ protected:
         gTestScene.clearEvents();
     }
 };
-
-}  // namespace
-
-// Needs a process in which no handler has run yet (CTest runs each test alone).
-TEST(DefaultWindow, IsFiveFortyByNineSixtyAtTheOriginAndNormalisesItsCentreToOneHalf) {
-    EXPECT_TRUE(window() == (Ints{0, 0, 540, 960}) && App::mouseNormalize(270, 480) == glm::vec2(0.5f, 0.5f) &&
-                gpScene == nullptr && AnimationManager::mNow == 0.0f);
-}
-
-TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
-    gTestScene.names = {"sky", "glass"};
-    gTestScene.drawResult = 3;
-    std::vector<std::string>& returned = App::handleStart(5, 7, 0, -3);
-    EXPECT_EQ(window(), (Ints{5, 7, 1, 1})) << "clamped to one pixel";
-    EXPECT_TRUE(&returned == &gpScene->mNames && returned == gTestScene.names);
-    everyEventButInitialisation();
-    EXPECT_EQ(taken(), "C1,1");
-    App::handleInitEffect();
-    Timer::mStartingCnt = {1, 0};
-    App::handleInitEffect();  // initialises once, but restarts the clock
-    EXPECT_NE(Timer::mStartingCnt.tv_sec, 1);
-    AnimationManager::mNow = -1.0f;
-    for (void (*event)() : {App::handleAffordance, App::handleUnlock}) event();
-    App::handleParam(-5, 123456789);
-    App::handleKey(1000);
-    App::handleMouseMove(5, 7);  // the window's top left corner
-    EXPECT_EQ(App::handleDraw(), 3);
-    for (const TestSceneEvent& e : gTestScene.events) EXPECT_GE(e.now, 0.0f) << "the clock first";
-    EXPECT_EQ(taken(), "Icalp-5,123456789k1000m(0.000000,1.000000)F");
-    // The host moves the window: no lock, and no word to the scene.
-    App::handleWindowRectangle(-3, -4, 0, -20);
-    EXPECT_TRUE(window() == (Ints{-3, -4, 1, 1}) && gpScene->mSize == glm::vec2(1.0f, 1.0f) && taken().empty());
-    // A clear restarts the clock after the scene cleared, not before.
-    Timer::mStartingCnt = {1, 0};
-    AnimationManager::mNow = -1.0f;
-    App::handleClearEffect();
-    EXPECT_EQ(gTestScene.events.at(0).now, -1.0f);
-    EXPECT_TRUE(Timer::mStartingCnt.tv_sec != 1 && AnimationManager::mNow >= 0.0f);
-    App::handleRestart();
-    App::handleStart(0, 0, 540, 960);
-    everyEventButInitialisation();  // the new scene waits for its initialisation
-    App::handleStop();
-    everyEventButInitialisation();
-    App::handleInitEffect();
-    EXPECT_TRUE(taken() == "cDC1,1IDC540,960D" && gpScene == nullptr);
-}
-
-// The host may send any int: every value but 0 is the one alternate
-// orientation, initialised once, and a scene hears nothing in an orientation
-// it was not initialised for. Under ASan/UBSan a value used as an index is
-// reported at once.
-TEST_F(Handlers, EveryNonZeroOrientationIsTheOneAlternateAndWaitsForItsInitialisation) {
-    startReady(0, 0, 540, 960);
-    setOrientation(nullptr, nullptr, 7);
-    everyEventButInitialisation();
-    for (int value : {7, -1, 2, INT_MAX, INT_MIN, 1, 0, INT_MIN}) {
-        App::handleInitEffect();
-        setOrientation(nullptr, nullptr, value);
-        App::handleDraw();
-        EXPECT_EQ(gTestScene.events.back().orientation, value);
-    }
-    EXPECT_EQ(taken(), "AFFFFFFFF");
-}
-
-struct Step : Animation {
-    std::function<void(float)> run;
-    void update(float now) override { run(now); }
-};
-
-// The animations of a ready frame run in storage order after the clock is
-// advanced and before the scene draws, each given the clock as it is then (an
-// update may move it); one added by an update waits for the next frame.
-TEST_F(Handlers, AReadyFrameUpdatesTheAnimationsInOrderBeforeTheScene) {
-    std::vector<float> times;
-    Step first, second, late;
-    first.run = [&](float now) {
-        times.push_back(now);
-        AnimationManager::mNow += 100.0f;
-        AnimationManager::mStorage.push_back(&late);
-    };
-    second.run = late.run = [&](float now) { times.push_back(now); };
-    AnimationManager::mStorage = {&first, &second};
-    startReady(0, 0, 540, 960);
-    AnimationManager::mNow = -1.0f;
-    App::handleDraw();
-    ASSERT_EQ(times.size(), 2u);
-    EXPECT_TRUE(times[0] >= 0.0f && times[1] == times[0] + 100.0f && gTestScene.events.back().now == times[1]);
-    App::handleDraw();
-    EXPECT_EQ(times.size(), 5u);
-}
-
-TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
-    const int kCalls = 10000;
-    startReady(0, 0, 540, 960);
-    auto run = [](std::function<void(int)> call) {
-        return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); });
-    };
-    std::thread threads[] = {run([](int) { App::handleDraw(); }), run([](int) { App::handleDraw(); }),
-                             run([](int i) { (i % 2 ? App::handleMouseUp : App::handleMouseDown)(i, i); }),
-                             run([](int i) { App::handleParam(i, -i); }),
-                             // the host's keys, and the developer keys that stay under the lock
-                             run([](int i) { App::handleKey(Ints{0, 1, 2, 'A', 'U'}[i % 5]); })};
-    for (std::thread& thread : threads) thread.join();
-    EXPECT_EQ(gTestScene.overlaps, 0);
-    EXPECT_EQ(gTestScene.events.size(), std::size_t(5 * kCalls)) << "one event a call, 'A' too";
-}
-
-// The key 'C' takes the lock the key handler already holds: the thread never
-// comes back. Shown in a child, which reports just before the key and would
-// report again after it; it is given two seconds and then killed.
-TEST_F(Handlers, LetterCBlocksTheCallingThreadForGood) {
-    int reports[2], status = 0;
-    ASSERT_EQ(pipe(reports), 0);
-    const pid_t child = fork();
-    if (child == 0) {
-        startReady(0, 0, 540, 960);
-        if (write(reports[1], "B", 1) == 1) App::handleKey('C');
-        _exit(int(write(reports[1], "A", 1)));
-    }
-    char report = 0;
-    pollfd afterKey = {reports[0], POLLIN, 0};
-    EXPECT_TRUE(read(reports[0], &report, 1) == 1 && report == 'B');
-    EXPECT_EQ(poll(&afterKey, 1, 2000), 0) << "the key returned (or the child ended)";
-    EXPECT_TRUE(kill(child, SIGKILL) == 0 && waitpid(child, &status, 0) == child && WIFSIGNALED(status));
-}
-
-namespace {
 
 // The self-test key's published steps, followed with the same random numbers:
 // what the scene's record must show afterwards.
@@ -256,6 +113,103 @@ struct SelfTestSteps {
 
 }  // namespace
 
+// Needs a process in which no handler has run yet (CTest runs each test alone).
+TEST(DefaultWindow, IsFiveFortyByNineSixtyAtTheOriginAndNormalisesItsCentreToOneHalf) {
+    EXPECT_TRUE(window() == (Ints{0, 0, 540, 960}) && App::mouseNormalize(270, 480) == glm::vec2(0.5f, 0.5f) &&
+                gpScene == nullptr && AnimationManager::mNow == 0.0f);
+}
+
+TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
+    gTestScene.names = {"sky", "glass"};
+    gTestScene.drawResult = 3;
+    std::vector<std::string>& returned = App::handleStart(5, 7, 0, -3);
+    EXPECT_EQ(window(), (Ints{5, 7, 1, 1})) << "clamped to one pixel";
+    EXPECT_TRUE(&returned == &gpScene->mNames && returned == gTestScene.names);
+    everyEventButInitialisation();
+    EXPECT_EQ(gTestScene.taken(), "C1,1");
+    App::handleInitEffect();
+    Timer::mStartingCnt = {1, 0};
+    App::handleInitEffect();  // initialises once, but restarts the clock
+    EXPECT_NE(Timer::mStartingCnt.tv_sec, 1);
+    AnimationManager::mNow = -1.0f;
+    for (void (*event)() : {App::handleAffordance, App::handleUnlock}) event();
+    App::handleParam(-5, 123456789);
+    App::handleKey(1000);
+    App::handleMouseMove(5, 7);  // the window's top left corner
+    EXPECT_EQ(App::handleDraw(), 3);
+    for (const TestSceneEvent& e : gTestScene.events) EXPECT_GE(e.now, 0.0f) << "the clock first";
+    EXPECT_EQ(gTestScene.taken(), "Icalp-5,123456789k1000m(0.000000,1.000000)F");
+    // The host moves the window: no lock, and no word to the scene.
+    App::handleWindowRectangle(-3, -4, 0, -20);
+    EXPECT_TRUE(window() == (Ints{-3, -4, 1, 1}) && gpScene->mSize == glm::vec2(1.0f) && gTestScene.taken().empty());
+    // A clear restarts the clock after the scene cleared, not before.
+    Timer::mStartingCnt = {1, 0};
+    AnimationManager::mNow = -1.0f;
+    App::handleClearEffect();
+    EXPECT_EQ(gTestScene.events.at(0).now, -1.0f);
+    EXPECT_TRUE(Timer::mStartingCnt.tv_sec != 1 && AnimationManager::mNow >= 0.0f);
+    App::handleRestart();
+    App::handleStart(0, 0, 540, 960);
+    everyEventButInitialisation();  // the new scene waits for its initialisation
+    App::handleStop();
+    everyEventButInitialisation();
+    App::handleInitEffect();
+    EXPECT_TRUE(gTestScene.taken() == "cDC1,1IDC540,960D" && gpScene == nullptr);
+}
+
+// The host may send any int: every value but 0 is the one alternate
+// orientation, initialised once, and a scene hears nothing in an orientation
+// it was not initialised for. Under ASan/UBSan a value used as an index is
+// reported at once.
+TEST_F(Handlers, EveryNonZeroOrientationIsTheOneAlternateAndWaitsForItsInitialisation) {
+    startReady(0, 0, 540, 960);
+    setOrientation(nullptr, nullptr, 7);
+    everyEventButInitialisation();
+    for (int value : {7, -1, 2, INT_MAX, INT_MIN, 1, 0, INT_MIN}) {
+        App::handleInitEffect();
+        setOrientation(nullptr, nullptr, value);
+        App::handleDraw();
+        EXPECT_EQ(gTestScene.events.back().orientation, value);
+    }
+    EXPECT_EQ(gTestScene.taken(), "AFFFFFFFF");
+}
+
+TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
+    const int kCalls = 10000;
+    startReady(0, 0, 540, 960);
+    auto run = [](std::function<void(int)> call) {
+        return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); });
+    };
+    std::thread threads[] = {run([](int) { App::handleDraw(); }), run([](int) { App::handleDraw(); }),
+                             run([](int i) { (i % 2 ? App::handleMouseUp : App::handleMouseDown)(i, i); }),
+                             run([](int i) { App::handleParam(i, -i); }),
+                             // the host's keys, and the developer keys that stay under the lock
+                             run([](int i) { App::handleKey(Ints{0, 1, 2, 'A', 'U'}[i % 5]); })};
+    for (std::thread& thread : threads) thread.join();
+    EXPECT_EQ(gTestScene.overlaps, 0);
+    EXPECT_EQ(gTestScene.events.size(), std::size_t(5 * kCalls)) << "one event a call, 'A' too";
+}
+
+// The key 'C' takes the lock the key handler already holds: the thread never
+// comes back. Shown in a child, which reports just before the key and would
+// report again after it; it is given two seconds and then killed.
+TEST_F(Handlers, LetterCBlocksTheCallingThreadForGood) {
+    int reports[2], status = 0;
+    ASSERT_EQ(pipe(reports), 0);
+    const pid_t child = fork();
+    if (child == 0) {
+        startReady(0, 0, 540, 960);
+        if (write(reports[1], "B", 1) == 1) App::handleKey('C');
+        _exit(int(write(reports[1], "A", 1)));
+    }
+    char report = 0;
+    pollfd afterKey = {reports[0], POLLIN, 0};
+    EXPECT_TRUE(read(reports[0], &report, 1) == 1 && report == 'B');
+    EXPECT_EQ(poll(&afterKey, 1, 2000), 0) << "the key returned (or the child ended)";
+    EXPECT_TRUE(kill(child, SIGKILL) == 0 && waitpid(child, &status, 0) == child && WIFSIGNALED(status));
+}
+
+
 // The developer key 'T': whatever the seed, every step of its random run
 // reaches the scene in order, it draws exactly the random numbers its steps
 // name, and it leaves the last window it set. Seeds 1 to 8 reach each of the
@@ -271,7 +225,7 @@ TEST_F(Handlers, SelfTestKeyRunsEveryStepOfItsRandomSequence) {
         srand48(seed);
         App::handleKey('T');
         EXPECT_EQ(lrand48(), next) << "the random numbers drawn";
-        EXPECT_TRUE(taken() == steps.seen) << "the scene's record differs from the steps";
+        EXPECT_TRUE(gTestScene.taken() == steps.seen) << "the scene's record differs from the steps";
         EXPECT_TRUE(window() == (Ints{steps.left, steps.top, steps.width, steps.height}) && !gTestScene.overlaps);
     }
 }

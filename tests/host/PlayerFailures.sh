@@ -7,11 +7,11 @@ set -uo pipefail
 player="$1" plugin="$2" nofactory="$3"
 rm -rf "$4" && mkdir -p "$4" && cd "$4" || exit 1
 echo "not a picture" | tee broken.png > libgarbage.so
-failures=0 n=0 rows=0
+failures=0 n=0
 fail() { echo "FAIL ($args): $*"; cat stderr.txt; failures=$((failures + 1)); }
 
 while IFS=';' read -r status message args; do
-  actual=0 rows=$((rows + 1))
+  actual=0
   # shellcheck disable=SC2086  # the arguments are words
   "$player" --quiet --out result $args > /dev/null 2> stderr.txt || actual=$?
   [ "$actual" -eq "$status" ] || fail "status $actual, expected $status"
@@ -48,7 +48,6 @@ NaN unlock|3: "NaN" is not a time in seconds
 LINES
 )
 
-args="the table" && [ "$rows" -eq 20 ] || fail "$rows rows run"
 # A folder the player did not write is never replaced; the usage asked for is no failure.
 mkdir -p result && touch result/keep
 args="a foreign folder"

@@ -20,7 +20,6 @@
 #include "Render/Texture.h"
 #include "TestSceneRecord.h"
 
-extern "C" vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);
 extern "C" void __real_free(void* p);
 double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
 extern "C" void __wrap_free(void* p) {

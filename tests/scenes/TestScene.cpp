@@ -2,8 +2,10 @@
 // a call that begins while another one is still inside a scene. Its Java
 // face, the natives of com.tarq.test.TestScene, is found by the JVM because
 // the Java test loads this plug-in with System.load before the runtime opens
-// it (both then share one copy).
+// it (both then share one copy); with it, what the Java test needs of a host
+// besides the entry points: a GL context and the loader's pending error.
 #include <EGL/egl.h>
+#include <dlfcn.h>
 #include <GLES2/gl2.h>
 #include <jni.h>
 
@@ -12,12 +14,25 @@
 
 #include "Application/AnimationManager.h"
 #include "Application/ApplicationVar.h"
-#include "Application/Scene.h"
+#include "GlContext.h"
 #include "Render/Background.h"
 #include "Render/Texture.h"
 #include "TestSceneRecord.h"
 
 TestSceneState gTestScene;
+
+std::string TestSceneState::taken() {
+    std::string seen;
+    for (const TestSceneEvent& e : events) {
+        seen += e.factory == 2 && e.kind == TestSceneCreated ? 'S' : "CDcaltIAFdumkp"[e.kind];
+        if (e.kind == TestSceneCreated || e.kind == TestSceneParam || e.kind == TestSceneKeyPressed)
+            seen += std::to_string(e.a) + (e.kind == TestSceneKeyPressed ? "" : "," + std::to_string(e.b));
+        if (e.kind >= TestSceneTouchDown && e.kind <= TestSceneTouchMove)
+            seen += "(" + std::to_string(e.x) + "," + std::to_string(e.y) + ")";
+    }
+    clearEvents();
+    return seen;
+}
 
 namespace {
 
@@ -48,9 +63,8 @@ public:
     void param(int a, int b) override { note(TestSceneParam, a, b); }
     int draw() override {
         note(TestSceneDraw);
-        const float* c = gTestScene.clearColour;
-        if (gTestScene.clear) {
-            glClearColor(c[0], c[1], c[2], c[3]);
+        if (gTestScene.picture) {
+            glClearColor(0.0f, 0.0f, 0.0f, 1.0f);
             glClear(GL_COLOR_BUFFER_BIT);
         }
         // The picture is made in the first frame with a context and the image
@@ -113,15 +127,19 @@ JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint res
 // look the factory up again.
 JNIEXPORT void JNICALL TESTSCENE_NATIVE(useSecondFactory)(JNIEnv*, jclass) { vi::gCreateScene = createSecondScene; }
 
-JNIEXPORT jint JNICALL TESTSCENE_NATIVE(eventCount)(JNIEnv*, jclass) { return jint(gTestScene.events.size()); }
+JNIEXPORT jstring JNICALL TESTSCENE_NATIVE(taken)(JNIEnv* env, jclass) {
+    return env->NewStringUTF(gTestScene.taken().c_str());
+}
 
-// kind, factory, a, b
-JNIEXPORT jintArray JNICALL TESTSCENE_NATIVE(eventInts)(JNIEnv* env, jclass, jint index) {
-    const TestSceneEvent& e = gTestScene.events.at(std::size_t(index));
-    const jint values[] = {e.kind, e.factory, e.a, e.b};
-    jintArray array = env->NewIntArray(4);
-    env->SetIntArrayRegion(array, 0, 4, values);
-    return array;
+// A headless GL context current on the calling thread, as the host's render thread has one.
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(makeContextCurrent)(JNIEnv*, jclass) {
+    static vitest::GlContext* context = new vitest::GlContext(64, 64);
+    context->makeCurrent();
+}
+
+JNIEXPORT jstring JNICALL TESTSCENE_NATIVE(loaderError)(JNIEnv* env, jclass) {
+    const char* error = dlerror();
+    return error ? env->NewStringUTF(error) : nullptr;
 }
 
 }  // extern "C"

@@ -10,6 +10,8 @@
 #include <string>
 #include <vector>
 
+#include "Application/Scene.h"
+
 enum TestSceneEventKind {
     TestSceneCreated, TestSceneDestroyed, TestSceneClearEffect, TestSceneAffordance, TestSceneUnlock,
     TestSceneTextureUpdated, TestSceneInitEffect, TestSceneInitEffectAlternate, TestSceneDraw, TestSceneTouchDown,
@@ -27,14 +29,12 @@ struct TestSceneEvent {
     float now;
 };
 
-struct TestSceneState {
+struct __attribute__((visibility("default"))) TestSceneState {
     std::vector<std::string> names;  // a new scene's
     int drawResult = 0;
-    // When set, draw first clears the colour buffer of the current context to this colour.
-    bool clear = false;
-    float clearColour[4] = {};
-    // When set, draw then shows the host's image filed under the scene's first
-    // name over the whole frame (while it has client pixels).
+    // When set, draw clears the colour buffer of the current context to opaque
+    // black, then shows the host's image filed under the scene's first name
+    // over the whole frame (while it has client pixels).
     bool picture = false;
     std::vector<TestSceneEvent> events;
     int overlaps = 0;  // calls that began while another call into a scene was still running
@@ -43,8 +43,14 @@ struct TestSceneState {
         events.clear();
         overlaps = 0;
     }
+    // The events so far, then cleared: one letter per event in the order of
+    // TestSceneEventKind ('S' for a scene the second factory made), with the
+    // arguments of a start, a touch, a key and a parameter.
+    std::string taken();
     // Forgets every event and restores the defaults.
     void reset() { *this = TestSceneState(); }
 };
 
 extern __attribute__((visibility("default"))) TestSceneState gTestScene;
+// The recording scene's factory.
+extern "C" vi::Scene* createScene(int* size, vi::ModelsMap* models, vi::TexturesMap* textures);

@@ -21,20 +21,12 @@ FakeJni::FakeJni() {
     };
     mTable.FindClass = [](JNIEnv* env, const char* name) { return reinterpret_cast<jclass>(self(env).make(name, {})); };
     mTable.NewStringUTF = [](JNIEnv* env, const char* chars) { return self(env).string(chars); };
-    mTable.NewObjectArray = [](JNIEnv* env, jsize length, jclass type, jobject initial) {
-        Object* array = self(env).make(self(env).find(type)->text, {});
-        array->objects.assign(std::size_t(length), self(env).find(initial));
-        return reinterpret_cast<jobjectArray>(array);
+    // An object array keeps nothing: no test reads its elements.
+    mTable.NewObjectArray = [](JNIEnv* env, jsize, jclass, jobject) {
+        return reinterpret_cast<jobjectArray>(self(env).make("", {}));
     };
-    mTable.SetObjectArrayElement = [](JNIEnv* env, jobjectArray array, jsize index, jobject value) {
-        self(env).find(array)->objects.at(std::size_t(index)) = self(env).find(value);
-    };
+    mTable.SetObjectArrayElement = [](JNIEnv*, jobjectArray, jsize, jobject) {};
     mEnv.functions = &mTable;
-}
-
-FakeJni::Object* FakeJni::make(const std::string& text, const std::vector<jint>& ints) {
-    mObjects.emplace_back(new Object{text, ints, {}});
-    return mObjects.back().get();
 }
 
 FakeJni::Object* FakeJni::find(const void* handle) const {
@@ -49,14 +41,6 @@ void* FakeJni::lend(const void* bytes, std::size_t size) {
     void* address = &(*copy)[0];
     mLeases[address] = std::move(copy);
     return address;
-}
-
-std::vector<std::string> FakeJni::stringArrayValues(jobjectArray array) const {
-    std::vector<std::string> values;
-    const Object* found = find(array);
-    if (found && found->text == "java/lang/String")
-        for (const Object* element : found->objects) values.push_back(element->text);
-    return values;
 }
 
 }  // namespace vitest

@@ -2,7 +2,7 @@
 
 // A JNIEnv without a Java VM, for calling the runtime's JNI entry points from
 // C++ as the host's Java side would. Only what those entry points call is
-// filled in (strings, int arrays, String arrays); every other slot is null,
+// filled in (strings, int arrays, String arrays made empty); every other slot is null,
 // so an unexpected JNI call crashes at once. Like a JVM it hands out copies
 // of string chars and array elements and counts those not given back.
 // Objects live until reset(), as local references live until the native
@@ -38,15 +38,12 @@ namespace vitest {
 class FakeJni {
 public:
     FakeJni();
-    FakeJni(const FakeJni&) = delete;
-    FakeJni& operator=(const FakeJni&) = delete;
+    FakeJni(const FakeJni&) = delete;  // nor moved nor assigned: the table points back at this one
 
     JNIEnv* env() { return &mEnv; }
     // Java-side values, alive until reset().
     jstring string(const std::string& text) { return reinterpret_cast<jstring>(make(text, {})); }
     jintArray intArray(const std::vector<jint>& values) { return reinterpret_cast<jintArray>(make("", values)); }
-    // The elements of a String[] the runtime made; none if `array` is not one.
-    std::vector<std::string> stringArrayValues(jobjectArray array) const;
     // String chars and array elements handed out and not given back.
     int outstanding() const { return int(mLeases.size()); }
     // Ends the "native call": local references die.
@@ -54,13 +51,15 @@ public:
 
 private:
     struct Object {
-        std::string text;              // a string; a class's or an object array's element class name
-        std::vector<jint> ints;        // an int array
-        std::vector<Object*> objects;  // an object array
+        std::string text;        // a string, or a class's name
+        std::vector<jint> ints;  // an int array
     };
 
     static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
-    Object* make(const std::string& text, const std::vector<jint>& ints);
+    Object* make(const std::string& text, const std::vector<jint>& ints) {
+        mObjects.emplace_back(new Object{text, ints});
+        return mObjects.back().get();
+    }
     // Any handle not made here is null: a JNI call on it then crashes at once.
     Object* find(const void* handle) const;
     // A copy of `size` bytes with a zero after them (a string's terminator),

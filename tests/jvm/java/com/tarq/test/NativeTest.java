@@ -4,8 +4,6 @@ import static org.junit.jupiter.api.Assertions.*;
 
 import com.tarq.android.visualeffect.common.Native;
 import java.io.File;
-import java.util.ArrayList;
-import java.util.List;
 import org.junit.jupiter.api.Test;
 
 /**
@@ -16,20 +14,15 @@ import org.junit.jupiter.api.Test;
  */
 class NativeTest {
     static {
-        // The runtime first, so that the test plug-in and TestHost.cpp bind to the one runtime Native talks to.
-        for (String library : new String[] {"runtime", "testscene", "testhost"}) {
-            System.load(System.getProperty("vi." + library));
-        }
-        makeContextCurrent();
+        // The runtime first, so that the test plug-in binds to the one runtime Native talks to.
+        System.load(System.getProperty("vi.runtime"));
+        System.load(System.getProperty("vi.testscene"));
+        TestScene.makeContextCurrent();
     }
 
     private static final String PLUGIN = System.getProperty("vi.testscene");
     private final Native host = new Native();
 
-    /** A headless GL context current on this thread, as the host's render thread has one. */
-    static native void makeContextCurrent();
-    /** The dynamic loader's pending error, or null; reading it clears it. */
-    static native String loaderError();
 
     @Test
     void aHostStartsDrawsRestartsFailsToStartAndLoadsImages() {
@@ -46,21 +39,15 @@ class NativeTest {
         assertArrayEquals(new String[0], host.prehandleStart(PLUGIN, 300, 400));
         // A library without a factory and one that is not there: null, the running scene stopped.
         assertNull(host.prehandleStart(System.getProperty("vi.nofactory"), 64, 64));
-        loaderError();  // read and cleared: what comes next is the failed open's
+        TestScene.loaderError();  // read and cleared: what comes next is the failed open's
         assertNull(host.prehandleStart(new File(PLUGIN).getParent() + "/libvi_not_there.so", 64, 64));
-        String error = loaderError();
+        String error = TestScene.loaderError();
         assertTrue(error != null && error.contains("libvi_not_there.so"), error);
         assertEquals(0, host.prehandleDraw(), "no scene draws");
         // Another path (the first one again) is looked up afresh.
         host.prehandleStart(PLUGIN, 64, 64);
-        List<String> lives = new ArrayList<>();
-        for (int i = 0; i < TestScene.eventCount(); ++i) {
-            int[] event = TestScene.eventInts(i);  // kind, factory, width, height
-            if (event[0] == TestScene.CREATED) lives.add("made by " + event[1] + " at " + event[2] + " x " + event[3]);
-            if (event[0] == TestScene.DESTROYED) lives.add("destroyed");
-        }
-        assertEquals(List.of("made by 1 at 64 x 64", "destroyed", "made by 2 at 300 x 400", "destroyed",
-            "made by 1 at 64 x 64"), lives);
+        // Made (C, or S by the second factory) at a size, initialised, drawn, destroyed.
+        assertEquals("C64,64IFDS300,400DC64,64", TestScene.taken());
 
         // The host's pixels, ARGB ints, are swapped to RGBA bytes in its own array: a block of four, then two.
         int[] pixels = {0xFF112233, 0x80AABBCC, 0x01020304, 0x7F8E9DAC, 0x00FFEEDD, 0x10203040};
@@ -72,15 +59,16 @@ class NativeTest {
 
 /** The recording scene of the test plug-in (tests/scenes): its settings and what it saw. */
 final class TestScene {
-    static final int CREATED = 0;
-    static final int DESTROYED = 1;
-
     /** Forgets everything and restores the defaults. */
     static native void reset();
     static native void setNames(String[] names);
     static native void setDrawResult(int result);
     /** Puts the plug-in's second factory into the runtime's factory pointer. */
     static native void useSecondFactory();
-    static native int eventCount();
-    static native int[] eventInts(int index);
+    /** What the scenes saw since the last call, as the C++ tests read it (tests/scenes/TestSceneRecord.h). */
+    static native String taken();
+    /** A headless GL context current on this thread, as the host's render thread has one. */
+    static native void makeContextCurrent();
+    /** The dynamic loader's pending error, or null; reading it clears it. */
+    static native String loaderError();
 }
