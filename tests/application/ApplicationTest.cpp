@@ -47,7 +47,6 @@ class Handlers : public ::testing::Test {
 protected:
     void SetUp() override {
         App::handleStop();
-        AnimationManager::mStorage.clear();
         gTestScene.reset();
         gCreateScene = createScene;
     }
