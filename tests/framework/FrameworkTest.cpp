@@ -7,13 +7,10 @@
 #include <stdlib.h>
 #include <unistd.h>
 
-#include <cstdint>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <memory>
-#include <string>
-#include <vector>
 
 #include "GlRecorder.h"
 #include "Painters.h"
@@ -94,22 +91,9 @@ protected:
         return readPixel(x, y);
     }
 
-    // Light and eye straight above the centre, far enough for the
-    // interpolated directions to be straight up there.
-    void bindLighting(vi::Renderer& renderer) {
-        renderer.addUniform("uAmbient", &ambient, vi::Uniform::Float, 1);
-        renderer.addUniform("uDiffuse", &diffuse, vi::Uniform::Float, 1);
-        renderer.addUniform("uSpecular", &specular, vi::Uniform::Float, 1);
-        renderer.addUniform("uShininess", &shininess, vi::Uniform::Float, 1);
-        renderer.addUniform("uLightPosition", &light[0], vi::Uniform::Float3, 1);
-        renderer.addUniform("uEyePosition", &eye[0], vi::Uniform::Float3, 1);
-    }
-
     vitest::GlContext gl{64, 64};
     std::uint8_t texels[16] = {200, 100, 50, 255, 0, 255, 0, 255, 0, 0, 255, 255, 255, 255, 255, 255};
     vi::Texture plain{texels, 1, 1, true, false, false, false, false, 4, false};
-    float ambient = 0, diffuse = 0, specular = 0, shininess = 1;
-    glm::vec3 light{0, 0, 100}, eye{0, 0, 100};
 };
 
 }  // namespace
@@ -175,7 +159,16 @@ TEST_F(Framework, ModelsFillDrawablesInPlaceAndALitModelShowsTheFactorsWhereItsV
     drawable.texture = &plain;
     model.fillDrawable(drawable);
     vi::LightRenderer renderer(drawable);
-    bindLighting(renderer);
+    // Light and eye straight above the centre, far enough for the
+    // interpolated directions to be straight up there.
+    float ambient = 0, diffuse = 0, specular = 0, shininess = 1;
+    glm::vec3 light{0, 0, 100}, eye{0, 0, 100};
+    renderer.addUniform("uAmbient", &ambient, vi::Uniform::Float, 1);
+    renderer.addUniform("uDiffuse", &diffuse, vi::Uniform::Float, 1);
+    renderer.addUniform("uSpecular", &specular, vi::Uniform::Float, 1);
+    renderer.addUniform("uShininess", &shininess, vi::Uniform::Float, 1);
+    renderer.addUniform("uLightPosition", &light[0], vi::Uniform::Float3, 1);
+    renderer.addUniform("uEyePosition", &eye[0], vi::Uniform::Float3, 1);
     // Ambient, diffuse, specular, the light's height and the opacity. Specular
     // light is added uncoloured: 0.4 adds 102 to every channel.
     const float rows[][5] = {{0.5f, 0, 0, 100, 1}, {1, 0, 0, 100, 0.5f},    {0, 1, 0, 100, 1},

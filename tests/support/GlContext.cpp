@@ -84,9 +84,4 @@ std::vector<std::uint8_t> readPixels(int x, int y, int width, int height) {
     return pixels;
 }
 
-std::uint32_t readPixel(int x, int y) {
-    const std::vector<std::uint8_t> p = readPixels(x, y, 1, 1);
-    return std::uint32_t(p[0]) << 24 | std::uint32_t(p[1]) << 16 | std::uint32_t(p[2]) << 8 | p[3];
-}
-
 }  // namespace vitest

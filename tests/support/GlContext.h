@@ -39,7 +39,5 @@ private:
 
 // RGBA bytes of the current framebuffer's rectangle, bottom row first (as GL reads).
 std::vector<std::uint8_t> readPixels(int x, int y, int width, int height);
-// One pixel as 0xRRGGBBAA.
-std::uint32_t readPixel(int x, int y);
 
 }  // namespace vitest

@@ -102,7 +102,6 @@ auto forward(const char* name, Real real) {
     extern "C" ret __wrap_##name params { return forward<ret>(#name, [&] { return __real_##name args; }) args; }
 
 // The list vi_link_recorded() wraps is read from the lines below.
-WRAP(void, glActiveTexture, (GLenum a), (a))
 WRAP(void, glAttachShader, (GLuint a, GLuint b), (a, b))
 WRAP(void, glBindBuffer, (GLenum a, GLuint b), (a, b))
 WRAP(void, glBindFramebuffer, (GLenum a, GLuint b), (a, b))

@@ -22,18 +22,20 @@
 
 namespace vitest {
 
-// RGBA bytes as one 0xRRGGBBAA value, the form readPixel() returns.
-inline std::uint32_t rgba(const std::uint8_t* p) {
-    return (std::uint32_t(p[0]) << 24) | (std::uint32_t(p[1]) << 16) | (std::uint32_t(p[2]) << 8) | p[3];
+// RGBA bytes as 0xRRGGBBAA words.
+inline std::vector<std::uint32_t> words(const std::vector<std::uint8_t>& bytes) {
+    std::vector<std::uint32_t> result;
+    for (std::size_t i = 0; i < bytes.size(); i += 4)
+        result.push_back(std::uint32_t(bytes[i]) << 24 | std::uint32_t(bytes[i + 1]) << 16 |
+                         std::uint32_t(bytes[i + 2]) << 8 | bytes[i + 3]);
+    return result;
 }
 
-// The current framebuffer's rectangle as 0xRRGGBBAA words, bottom row first.
+// The current framebuffer's rectangle as words, bottom row first, and one pixel.
 inline std::vector<std::uint32_t> readWords(int x, int y, int width, int height) {
-    const std::vector<std::uint8_t> bytes = readPixels(x, y, width, height);
-    std::vector<std::uint32_t> words;
-    for (std::size_t i = 0; i < bytes.size(); i += 4) words.push_back(rgba(&bytes[i]));
-    return words;
+    return words(readPixels(x, y, width, height));
 }
+inline std::uint32_t readPixel(int x, int y) { return readWords(x, y, 1, 1)[0]; }
 
 // Every channel of two 0xRRGGBBAA words within `tolerance` of the other's.
 inline bool near(std::uint32_t a, std::uint32_t b, int tolerance) {
