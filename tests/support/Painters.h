@@ -66,51 +66,45 @@ struct Quad : vi::Drawable {
 };
 
 // A renderer of the quad with the given fragment shader.
-class QuadPainter {
-public:
+struct QuadPainter {
     explicit QuadPainter(const char* fragmentShader)
-        : mProgram(quadVertexShader(), fragmentShader), mRenderer(mProgram, mQuad) {
-        mRenderer.addAttribute("aPosition", mQuad.positions, 2, true);
+        : program(quadVertexShader(), fragmentShader), renderer(program, quad) {
+        renderer.addAttribute("aPosition", quad.positions, 2, true);
     }
-
-    vi::Renderer* renderer() { return &mRenderer; }
 
     // Draws into the window's width x height corner and returns those pixels, bottom row first.
     std::vector<std::uint32_t> draw(int width, int height) {
         glBindFramebuffer(GL_FRAMEBUFFER, 0);
         glViewport(0, 0, width, height);
-        mRenderer.render();
+        renderer.render();
         return readWords(0, 0, width, height);
     }
 
-protected:
-    vi::ShaderProgram mProgram;
-    Quad mQuad;
-    vi::Renderer mRenderer;
+    vi::ShaderProgram program;
+    Quad quad;
+    vi::Renderer renderer;
 };
 
-class ColourPainter : public QuadPainter {
-public:
+struct ColourPainter : QuadPainter {
     explicit ColourPainter(const glm::vec4& colour)
         : QuadPainter("precision mediump float;\n"
                       "uniform vec4 uColour;\n"
                       "void main() { gl_FragColor = uColour; }\n"),
           colour(colour) {
-        mRenderer.addUniform("uColour", &this->colour[0], vi::Uniform::Float4, 1);
+        renderer.addUniform("uColour", &this->colour[0], vi::Uniform::Float4, 1);
     }
 
     glm::vec4 colour;
 };
 
 // Binds `source` through the renderer, as an effect would (which allocates it).
-class TexturePainter : public QuadPainter {
-public:
+struct TexturePainter : QuadPainter {
     explicit TexturePainter(vi::Texture* source)
         : QuadPainter("precision mediump float;\n"
                       "uniform sampler2D uSource;\n"
                       "varying vec2 vUv;\n"
                       "void main() { gl_FragColor = texture2D(uSource, vUv); }\n") {
-        mRenderer.addTexture("uSource", source);
+        renderer.addTexture("uSource", source);
     }
 };
 

@@ -205,13 +205,11 @@ TEST_F(TexturesTest, TargetAttachesItsTextureOverTheRenderbufferAndDeletesWhatIt
     GlRecording recording;
     target->allocate();
     target->allocate();
-    EXPECT_EQ(GlRecorder::names({"glGenTextures", "glTexImage2D", "glGenRenderbuffers", "glRenderbufferStorage",
-                                 "glGenFramebuffers", "glBindFramebuffer", "glFramebufferRenderbuffer",
+    // Made once: the renderbuffers' creation is pinned by their arguments below.
+    EXPECT_EQ(GlRecorder::names({"glTexImage2D", "glBindFramebuffer", "glFramebufferRenderbuffer",
                                  "glFramebufferTexture2D", "glCheckFramebufferStatus"}),
-              (Names{"glGenTextures", "glTexImage2D", "glGenRenderbuffers", "glRenderbufferStorage",
-                     "glGenFramebuffers", "glBindFramebuffer", "glFramebufferRenderbuffer", "glFramebufferTexture2D",
-                     "glGenRenderbuffers", "glRenderbufferStorage", "glFramebufferRenderbuffer",
-                     "glCheckFramebufferStatus", "glBindFramebuffer"}));
+              (Names{"glTexImage2D", "glBindFramebuffer", "glFramebufferRenderbuffer", "glFramebufferTexture2D",
+                     "glFramebufferRenderbuffer", "glCheckFramebufferStatus", "glBindFramebuffer"}));
     EXPECT_EQ(argumentOf("glRenderbufferStorage", 1), (Args{GL_RGBA4, GL_DEPTH_COMPONENT16}));
     EXPECT_EQ(argumentOf("glGenRenderbuffers", 0), (Args{1, 1}));  // one name each
     EXPECT_EQ(argumentOf("glBindRenderbuffer", 1),
@@ -242,7 +240,7 @@ TEST_F(TexturesTest, TargetAttachesItsTextureOverTheRenderbufferAndDeletesWhatIt
 // blue on the first.
 TEST_F(TexturesTest, NestedDynamicTargetIsDrawnFirstInEveryOuterPassAStaticOneOnlyOnRequest) {
     vitest::ColourPainter innerPainter(glm::vec4(1, 0, 0, 1));
-    std::vector<vi::Renderer*> innerRenderers = {innerPainter.renderer()};
+    std::vector<vi::Renderer*> innerRenderers = {&innerPainter.renderer};
     RenderableTexture inner(innerRenderers, 0, 0, 8, 8, false, false, false, false, false);
     inner.mTargetProjectionMatrix = glm::scale(glm::mat4(1.0f), glm::vec3(0.5f, 0.5f, 1.0f));
     std::uint8_t blue[4] = {0, 0, 255, 255};
@@ -250,9 +248,9 @@ TEST_F(TexturesTest, NestedDynamicTargetIsDrawnFirstInEveryOuterPassAStaticOneOn
     vitest::QuadPainter mixed("precision mediump float;\nuniform sampler2D uPlain;\nuniform sampler2D uTarget;\n"
                               "varying vec2 vUv;\nvoid main() {\n"
                               "  gl_FragColor = mix(texture2D(uPlain, vUv), texture2D(uTarget, vUv), 0.5);\n}\n");
-    mixed.renderer()->addTexture("uPlain", &plain);
-    mixed.renderer()->addTexture("uTarget", &inner);
-    std::vector<vi::Renderer*> outerRenderers = {mixed.renderer()};
+    mixed.renderer.addTexture("uPlain", &plain);
+    mixed.renderer.addTexture("uTarget", &inner);
+    std::vector<vi::Renderer*> outerRenderers = {&mixed.renderer};
     RenderableTexture outer(outerRenderers, 0, 0, 32, 32, true, false, false, false, true);
     outer.allocate();
     const glm::mat4 view = glm::translate(glm::mat4(1.0f), glm::vec3(0.0f, 0.3f, 0.0f)), projection = view * view;
