@@ -14,7 +14,7 @@ struct GlCall {
     std::string name;          // "glTexImage2D"
     std::vector<double> args;  // numbers in order, then the result; a name array or a
                                // value array as its first element, other pointers as addresses
-    std::string text;          // glShaderSource: the source; glGet*Location: the name
+    std::string text;          // glShaderSource: the source
 };
 
 class GlRecorder {

@@ -10,15 +10,9 @@
 #include <cstdlib>
 #include <vector>
 
-#include <glm/glm.hpp>
-
 #include "GlContext.h"
-#include "Render/Drawable.h"
-#include "Render/GL.h"
 #include "Render/Renderer.h"
-#include "Render/ShaderProgram.h"
 #include "Render/Texture.h"
-#include "Render/Uniform.h"
 
 namespace vitest {
 

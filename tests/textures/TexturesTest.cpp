@@ -34,7 +34,7 @@ extern "C" void __wrap_free(void* p) {
 
 namespace {
 
-constexpr std::uint32_t kRed = 0xFF0000FF, kGreen = 0x00FF00FF, kBlack = 0x000000FF;
+constexpr std::uint32_t kRed = 0xFF0000FF, kGreen = 0x00FF00FF;
 
 double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
 
