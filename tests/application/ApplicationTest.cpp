@@ -54,7 +54,7 @@ protected:
     static void startReady(int l, int t, int w, int h) {
         App::handleStart(l, t, w, h);
         App::handleInitEffect();
-        gTestScene.clearEvents();
+        gTestScene.taken();
     }
 };
 

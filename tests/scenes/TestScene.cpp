@@ -30,7 +30,8 @@ std::string TestSceneState::taken() {
         if (e.kind >= TestSceneTouchDown && e.kind <= TestSceneTouchMove)
             seen += "(" + std::to_string(e.x) + "," + std::to_string(e.y) + ")";
     }
-    clearEvents();
+    events.clear();
+    overlaps = 0;
     return seen;
 }
 

@@ -39,11 +39,7 @@ struct __attribute__((visibility("default"))) TestSceneState {
     std::vector<TestSceneEvent> events;
     int overlaps = 0;  // calls that began while another call into a scene was still running
 
-    void clearEvents() {
-        events.clear();
-        overlaps = 0;
-    }
-    // The events so far, then cleared: one letter per event in the order of
+    // The events so far, then cleared (the overlaps too): one letter per event in the order of
     // TestSceneEventKind ('S' for a scene the second factory made), with the
     // arguments of a start, a touch, a key and a parameter.
     std::string taken();

@@ -8,12 +8,12 @@ FakeJni::FakeJni() {
     std::memset(&mTable, 0, sizeof(mTable));
     mTable.reserved0 = this;
     mTable.GetStringUTFChars = [](JNIEnv* env, jstring string, jboolean*) {
-        const std::string& text = self(env).find(string)->text;
+        const std::string& text = self(env).mObjects.at(string)->text;
         return static_cast<const char*>(self(env).lend(text.data(), text.size()));
     };
     mTable.ReleaseStringUTFChars = [](JNIEnv* env, jstring, const char* chars) { self(env).mLeases.erase(chars); };
     mTable.GetIntArrayElements = [](JNIEnv* env, jintArray array, jboolean*) {
-        const std::vector<jint>& ints = self(env).find(array)->ints;
+        const std::vector<jint>& ints = self(env).mObjects.at(array)->ints;
         return static_cast<jint*>(self(env).lend(ints.data(), ints.size() * sizeof(jint)));
     };
     mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray, jint* elements, jint) {
@@ -27,12 +27,6 @@ FakeJni::FakeJni() {
     };
     mTable.SetObjectArrayElement = [](JNIEnv*, jobjectArray, jsize, jobject) {};
     mEnv.functions = &mTable;
-}
-
-FakeJni::Object* FakeJni::find(const void* handle) const {
-    for (const std::unique_ptr<Object>& owned : mObjects)
-        if (owned.get() == handle) return owned.get();
-    return nullptr;
 }
 
 void* FakeJni::lend(const void* bytes, std::size_t size) {

@@ -57,18 +57,17 @@ private:
 
     static FakeJni& self(JNIEnv* env) { return *static_cast<FakeJni*>(env->functions->reserved0); }
     Object* make(const std::string& text, const std::vector<jint>& ints) {
-        mObjects.emplace_back(new Object{text, ints});
-        return mObjects.back().get();
+        Object* object = new Object{text, ints};
+        mObjects[object].reset(object);
+        return object;
     }
-    // Any handle not made here is null: a JNI call on it then crashes at once.
-    Object* find(const void* handle) const;
     // A copy of `size` bytes with a zero after them (a string's terminator),
     // noted as handed out.
     void* lend(const void* bytes, std::size_t size);
 
     JNINativeInterface_ mTable;
     JNIEnv mEnv;
-    std::vector<std::unique_ptr<Object>> mObjects;
+    std::map<const void*, std::unique_ptr<Object>> mObjects;  // by handle: a handle not made here throws at once
     std::map<const void*, std::unique_ptr<std::string>> mLeases;  // by the address handed out
 };
 

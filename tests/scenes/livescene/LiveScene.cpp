@@ -17,15 +17,13 @@ public:
     void touchMove(const glm::vec2& position) override { mTouches.push_back(position); }
 
     int draw() override {
-        GLint viewport[4];
-        glGetIntegerv(GL_VIEWPORT, viewport);
         glClearColor(float(LIVE_SCENE_COLOUR >> 16) / 255.0f, float((LIVE_SCENE_COLOUR >> 8) & 0xFF) / 255.0f,
                      float(LIVE_SCENE_COLOUR & 0xFF) / 255.0f, 1.0f);
         glClear(GL_COLOR_BUFFER_BIT);
         glEnable(GL_SCISSOR_TEST);
         glClearColor(1.0f, 1.0f, 1.0f, 1.0f);
         for (const glm::vec2& touch : mTouches) {
-            glScissor(int(touch.x * float(viewport[2])) - 6, int(touch.y * float(viewport[3])) - 6, 12, 12);
+            glScissor(int(touch.x * mSize.x) - 6, int(touch.y * mSize.y) - 6, 12, 12);
             glClear(GL_COLOR_BUFFER_BIT);
         }
         glDisable(GL_SCISSOR_TEST);
