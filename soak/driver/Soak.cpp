@@ -85,12 +85,8 @@ std::vector<Call> sequence(std::uint64_t seed, int index) {
 // a host does not make: a restart before a start, images with no context
 // current. So any part of a
 // sequence is one a host may play, which shrinking relies on. The exit status.
-int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
+int play(std::uint64_t seed, int index, const std::vector<int>& only, bool verbose) {
     const std::vector<Call> calls = sequence(seed, index);
-    if (only.empty()) {
-        only.resize(calls.size());
-        std::iota(only.begin(), only.end(), 0);
-    }
     alarm(kHangSeconds);
     vitest::GlContext gl(kCanvas, kCanvas);
     vitest::FakeJni jni;
@@ -105,7 +101,8 @@ int play(std::uint64_t seed, int index, std::vector<int> only, bool verbose) {
         const bool drawn = VI_NATIVE(prehandleDraw)(env, nullptr) == kDrawn && context != None;
         return drawn ? vitest::readPixels(0, 0, kCanvas, kCanvas) : std::vector<std::uint8_t>();
     };
-    for (const int i : only) {
+    for (std::size_t k = 0; k < (only.empty() ? calls.size() : only.size()); ++k) {
+        const int i = only.empty() ? int(k) : only[k];
         const Call& c = calls.at(std::size_t(i));
         const int w = c.v[2] == 39 ? 1080 : c.v[2] % 13 * 5, h = c.v[2] == 39 ? 1920 : c.v[2] % 9 * 7;
         const std::string image = c.v[0] < 6 ? "picture" : "image";

@@ -24,10 +24,10 @@ TestSceneState gTestScene;
 std::string TestSceneState::taken() {
     std::string seen;
     for (const TestSceneEvent& e : events) {
-        seen += e.factory == 2 && e.kind == TestSceneCreated ? 'S' : "CDcaltIAFdumkp"[e.kind];
-        if (e.kind == TestSceneCreated || e.kind == TestSceneParam || e.kind == TestSceneKeyPressed)
-            seen += std::to_string(e.a) + (e.kind == TestSceneKeyPressed ? "" : "," + std::to_string(e.b));
-        if (e.kind >= TestSceneTouchDown && e.kind <= TestSceneTouchMove)
+        seen += e.factory == 2 && e.kind == 'C' ? 'S' : char(e.kind);
+        if (e.kind == 'C' || e.kind == 'p' || e.kind == 'k')
+            seen += std::to_string(e.a) + (e.kind == 'k' ? "" : "," + std::to_string(e.b));
+        if (e.kind == 'd' || e.kind == 'u' || e.kind == 'm')
             seen += "(" + std::to_string(e.x) + "," + std::to_string(e.y) + ")";
     }
     events.clear();
@@ -44,26 +44,26 @@ public:
     RecordingScene(const int* size, vi::TexturesMap* textures, int factory)
         : vi::Scene(size), mFactory(factory), mTextures(textures) {
         mNames = gTestScene.names;
-        note(TestSceneCreated, size[0], size[1]);
+        note('C', size[0], size[1]);
     }
     ~RecordingScene() override {
-        note(TestSceneDestroyed);
+        note('D');
         delete mPicture;
     }
 
-    void clearEffect() override { note(TestSceneClearEffect); }
-    void affordance() override { note(TestSceneAffordance); }
-    void unlock() override { note(TestSceneUnlock); }
-    void textureUpdated() override { note(TestSceneTextureUpdated); }
-    void initEffect() override { note(TestSceneInitEffect); }
-    void initEffectAlternate() override { note(TestSceneInitEffectAlternate); }
-    void touchDown(const glm::vec2& at) override { note(TestSceneTouchDown, 0, 0, at.x, at.y); }
-    void touchUp(const glm::vec2& at) override { note(TestSceneTouchUp, 0, 0, at.x, at.y); }
-    void touchMove(const glm::vec2& at) override { note(TestSceneTouchMove, 0, 0, at.x, at.y); }
-    void keyPressed(unsigned int key) override { note(TestSceneKeyPressed, int(key)); }
-    void param(int a, int b) override { note(TestSceneParam, a, b); }
+    void clearEffect() override { note('c'); }
+    void affordance() override { note('a'); }
+    void unlock() override { note('l'); }
+    void textureUpdated() override { note('t'); }
+    void initEffect() override { note('I'); }
+    void initEffectAlternate() override { note('A'); }
+    void touchDown(const glm::vec2& at) override { note('d', 0, 0, at.x, at.y); }
+    void touchUp(const glm::vec2& at) override { note('u', 0, 0, at.x, at.y); }
+    void touchMove(const glm::vec2& at) override { note('m', 0, 0, at.x, at.y); }
+    void keyPressed(unsigned int key) override { note('k', int(key)); }
+    void param(int a, int b) override { note('p', a, b); }
     int draw() override {
-        note(TestSceneDraw);
+        note('F');
         if (gTestScene.picture) {
             glClearColor(0.0f, 0.0f, 0.0f, 1.0f);
             glClear(GL_COLOR_BUFFER_BIT);
@@ -82,7 +82,7 @@ public:
 private:
     // Gives up the processor once inside, so that a call let in without the
     // lock finds the flag set.
-    void note(int kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
+    void note(char kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
         if (gInside.exchange(1)) ++gTestScene.overlaps;
         std::this_thread::yield();
         gTestScene.events.push_back({kind, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});

@@ -12,15 +12,12 @@
 
 #include "Application/Scene.h"
 
-enum TestSceneEventKind {
-    TestSceneCreated, TestSceneDestroyed, TestSceneClearEffect, TestSceneAffordance, TestSceneUnlock,
-    TestSceneTextureUpdated, TestSceneInitEffect, TestSceneInitEffectAlternate, TestSceneDraw, TestSceneTouchDown,
-    TestSceneTouchUp, TestSceneTouchMove, TestSceneKeyPressed, TestSceneParam
-};
-
-// factory: 1 for createScene, 2 for createSecondScene; a and b: a start's size
-// given to the factory, a parameter's two values, a key's code; x and y: a
-// touch's normalised point; orientation: the scene's during the call; now:
+// kind: the call's letter: C created, D destroyed, c clearEffect, a affordance,
+// l unlock, t textureUpdated, I initEffect, A initEffectAlternate, F draw,
+// d, u and m a touch down, up and move, k keyPressed, p param. factory: 1
+// for createScene, 2 for createSecondScene; a and b: a start's size given to
+// the factory, a parameter's two values, a key's code; x and y: a touch's
+// normalised point; orientation: the scene's during the call; now:
 // vi::AnimationManager::mNow during the call.
 struct TestSceneEvent {
     int kind, factory, a, b;
@@ -39,8 +36,8 @@ struct __attribute__((visibility("default"))) TestSceneState {
     std::vector<TestSceneEvent> events;
     int overlaps = 0;  // calls that began while another call into a scene was still running
 
-    // The events so far, then cleared (the overlaps too): one letter per event in the order of
-    // TestSceneEventKind ('S' for a scene the second factory made), with the
+    // The events so far, then cleared (the overlaps too): each event's letter
+    // ('S' for a scene the second factory made), with the
     // arguments of a start, a touch, a key and a parameter.
     std::string taken();
     // Forgets every event and restores the defaults.

@@ -10,7 +10,6 @@ import java.nio.file.StandardCopyOption;
 import java.util.List;
 import java.util.concurrent.Callable;
 import java.util.concurrent.TimeUnit;
-import java.util.stream.Stream;
 import javax.imageio.ImageIO;
 import org.junit.jupiter.api.Test;
 
@@ -47,16 +46,16 @@ class LiveWindowTest {
         live = new ProcessBuilder(viLive, "--size", "180x320", plugin.toString())
             .directory(scratch.toFile()).redirectOutput(out.toFile()).redirectError(err.toFile()).start();
         awaitText(out, "vi-live: playing");
-        String window = poll(() -> xdotool("search", "--pid", "" + live.pid()).lines().findFirst()
+        String window = poll(() -> run("xdotool", "search", "--pid", "" + live.pid()).lines().findFirst()
             .filter(id -> !id.startsWith("status")).orElse(null));
-        xdotool("mousemove", "--window", window, "90", "300");
+        run("xdotool", "mousemove", "--window", window, "90", "300");
         BufferedImage before = shot();
         assertEquals(BLUE, before.getRGB(90, 160) & WHITE, "the effect's colour");
 
         // A drag paints along its path and changes nothing farther than 8 pixels from it.
         StringBuilder drag = new StringBuilder("mousemove --window " + window + " 40 100 mousedown 1");
         for (int x = 44; x <= 140; x += 4) drag.append(" mousemove --window ").append(window).append(" " + x + " 100");
-        xdotool((drag + " mouseup 1").split(" "));
+        run(("xdotool " + drag + " mouseup 1").split(" "));
         BufferedImage painted = shot();
         for (int y = 0; y < 320; ++y) {
             for (int x = 0; x < 180; ++x) {
@@ -66,14 +65,14 @@ class LiveWindowTest {
         }
 
         // The orientation key turns the frame, drawn all over, and back.
-        xdotool("key", "o");
+        run("xdotool", "key", "o");
         BufferedImage w = shot();
         assertEquals(List.of(320, 180, BLUE), List.of(w.getWidth(), w.getHeight(), w.getRGB(300, 170) & WHITE));
-        xdotool("key", "o");
+        run("xdotool", "key", "o");
         assertTrue(GoldenImagesTest.matches(shot(), painted), "turned back");
 
         // After a lost context the frame is the one before, within the golden tolerance.
-        xdotool("key", "l");
+        run("xdotool", "key", "l");
         assertTrue(GoldenImagesTest.matches(shot(), painted), "after a lost context");
         assertTrue(Files.readString(out).contains("GL context lost and replaced"));
 
@@ -81,18 +80,18 @@ class LiveWindowTest {
         // that do not load leave it running and say why.
         rebuild(property("orange"), out, "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
-        assertEquals(window + "\nstatus 0", xdotool("search", "--pid", "" + live.pid()), "the same window");
+        assertEquals(window + "\nstatus 0", run("xdotool", "search", "--pid", "" + live.pid()), "the same window");
         rebuild(property("nofactory"), err, "the running effect stays: the library has no \"createScene\"");
         rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), err, "invalid ELF header");
         rebuild(property("missingsymbol"), err, "undefined symbol: absentFromEveryLibrary");
-        poll(() -> xdotool("getwindowname", window).contains("reload failed") ? "" : null);
+        poll(() -> run("xdotool", "getwindowname", window).contains("reload failed") ? "" : null);
 
         // Key code 67 would freeze the window for good: refused, and the window goes on.
         live.getOutputStream().write("keycode 67\n".getBytes(UTF_8));
         live.getOutputStream().flush();
         awaitText(err, "key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
-        xdotool("key", "q");
+        run("xdotool", "key", "q");
         assertTrue(live.waitFor(20, TimeUnit.SECONDS), "q did not close the window");
         assertEquals(0, live.exitValue(), Files.readString(err));
     }
@@ -106,7 +105,7 @@ class LiveWindowTest {
     /** Presses the screenshot key and reads the picture once it is there. */
     private BufferedImage shot() throws Exception {
         Path file = scratch.resolve(String.format("live-%03d.png", ++shots));
-        xdotool("key", "p");
+        run("xdotool", "key", "p");
         poll(() -> Files.exists(file) ? file : null);
         return ImageIO.read(file.toFile());
     }
@@ -123,10 +122,6 @@ class LiveWindowTest {
             assertTrue(live.isAlive(), "the window closed: " + Files.readString(err));
         }
         throw new AssertionError("nothing within 20 s; stderr: " + Files.readString(err));
-    }
-
-    private static String xdotool(String... args) throws Exception {
-        return run(Stream.concat(Stream.of("xdotool"), Stream.of(args)).toArray(String[]::new));
     }
 
     /** Runs a command to its end: its output, then "status N". */
