@@ -38,12 +38,11 @@ enum Kind { Start, Recycle, Draw, Touch, Param, Orientation, Image, Switch, Loss
 // Each kind of call: its name, how often it comes in a hundred calls (frames
 // and input most, as with a real host), the entry point of those that take no
 // argument, and the range of each argument of the others.
-using Range = std::pair<int, int>;
 struct KindInfo {
     const char* name;
     int weight;
     jint (*entry)(JNIEnv*, jobject);
-    std::vector<Range> ranges;
+    std::vector<std::pair<int, int>> ranges;
 };
 const KindInfo kKinds[] = {
     {"start", 4, nullptr, {{-40, 1200}, {-40, 2000}}}, {"recycleTextures", 2, nullptr, {}},
@@ -73,7 +72,7 @@ std::vector<Call> sequence(std::uint64_t seed, int index) {
         // Mostly a frame right after a context change: the one compared with the frame before it.
         if (i && calls[i - 1].kind >= Switch && calls[i - 1].kind < Plain && between(0, 3)) call.kind = Draw;
         int* value = call.v;
-        for (const Range& range : kKinds[call.kind].ranges) *value++ = between(range.first, range.second);
+        for (const std::pair<int, int>& range : kKinds[call.kind].ranges) *value++ = between(range.first, range.second);
         if (call.kind == Orientation && between(0, 7) == 0) call.v[0] = int(std::uint32_t(random()));  // any int
     }
     return calls;

@@ -72,17 +72,14 @@ struct SelfTestSteps {
                         std::to_string(1.0f - float(int(ry % height)) / float(height)) + ")F");
     }
     void orientationRestarts() {
-        const unsigned n = count();
-        for (unsigned i = 0; i < n; ++i) seen += started() + (i & 1 ? "AF" : "F");
+        for (unsigned i = 0, n = count(); i < n; ++i) seen += started() + (i & 1 ? "AF" : "F");
     }
     // With a shared counter the moves advance the phase's own counter.
     void gestures(bool sharedCounter) {
-        const unsigned n = count();
         unsigned i = 0;
-        for (unsigned gesture = 0; sharedCounter ? i < n : gesture < n; ++gesture) {
+        for (unsigned gesture = 0, n = count(); sharedCounter ? i < n : gesture < n; ++gesture) {
             touch('d');
-            const unsigned m = count();
-            for (unsigned move = 0; sharedCounter ? i < m : move < m; ++move) {
+            for (unsigned move = 0, m = count(); sharedCounter ? i < m : move < m; ++move) {
                 touch('m');
                 i += sharedCounter;
             }
@@ -91,8 +88,7 @@ struct SelfTestSteps {
         }
     }
     void windowRectangles() {
-        const unsigned n = count();
-        for (unsigned pass = 0; pass < n; ++pass) {
+        for (unsigned pass = 0, n = count(); pass < n; ++pass) {
             seen += started() + "F";
             left = int(lrand48() % 1080);
             top = int(lrand48() % 1920);

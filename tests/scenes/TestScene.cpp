@@ -109,20 +109,16 @@ JNIEXPORT vi::Scene* createSecondScene(int* size, vi::ModelsMap*, vi::TexturesMa
 
 #define TESTSCENE_NATIVE(method) Java_com_tarq_test_TestScene_##method
 
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(reset)(JNIEnv*, jclass) { gTestScene.reset(); }
-
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setNames)(JNIEnv* env, jclass, jobjectArray names) {
+JNIEXPORT void JNICALL TESTSCENE_NATIVE(configure)(JNIEnv* env, jclass, jobjectArray names, jint drawResult) {
+    gTestScene.drawResult = drawResult;
     gTestScene.names.clear();
     for (jsize i = 0; i < env->GetArrayLength(names); ++i) {
         jstring name = static_cast<jstring>(env->GetObjectArrayElement(names, i));
         const char* chars = env->GetStringUTFChars(name, nullptr);
         gTestScene.names.push_back(chars);
         env->ReleaseStringUTFChars(name, chars);
-        env->DeleteLocalRef(name);
     }
 }
-
-JNIEXPORT void JNICALL TESTSCENE_NATIVE(setDrawResult)(JNIEnv*, jclass, jint result) { gTestScene.drawResult = result; }
 
 // Makes the runtime's next start use createSecondScene, as long as it does not
 // look the factory up again.

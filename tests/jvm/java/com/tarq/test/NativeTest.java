@@ -26,16 +26,14 @@ class NativeTest {
 
     @Test
     void aHostStartsDrawsRestartsFailsToStartAndLoadsImages() {
-        TestScene.reset();
-        TestScene.setNames(new String[] {"sky", "glass", "fl\u00fcgel"});
+        TestScene.configure(new String[] {"sky", "glass", "fl\u00fcgel"}, Integer.MIN_VALUE);
         assertArrayEquals(new String[] {"sky", "glass", "fl\u00fcgel"}, host.prehandleStart(PLUGIN, 64, 64));
         host.prehandleInitEffect();
-        TestScene.setDrawResult(Integer.MIN_VALUE);
         assertEquals(Integer.MIN_VALUE, host.prehandleDraw());
 
         // The same path again keeps the factory found first: looked up again, it would undo this.
         TestScene.useSecondFactory();
-        TestScene.setNames(new String[0]);
+        TestScene.configure(new String[0], Integer.MIN_VALUE);
         assertArrayEquals(new String[0], host.prehandleStart(PLUGIN, 300, 400));
         // A library without a factory and one that is not there: null, the running scene stopped.
         assertNull(host.prehandleStart(System.getProperty("vi.nofactory"), 64, 64));
@@ -59,10 +57,8 @@ class NativeTest {
 
 /** The recording scene of the test plug-in (tests/scenes): its settings and what it saw. */
 final class TestScene {
-    /** Forgets everything and restores the defaults. */
-    static native void reset();
-    static native void setNames(String[] names);
-    static native void setDrawResult(int result);
+    /** A new scene's names, and what its frames return. */
+    static native void configure(String[] names, int drawResult);
     /** Puts the plug-in's second factory into the runtime's factory pointer. */
     static native void useSecondFactory();
     /** What the scenes saw since the last call, as the C++ tests read it (tests/scenes/TestSceneRecord.h). */

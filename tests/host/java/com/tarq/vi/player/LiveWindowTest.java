@@ -21,7 +21,7 @@ import org.junit.jupiter.api.Test;
  */
 class LiveWindowTest {
     private static final int BLUE = 0x2050E0, ORANGE = 0xF08020, WHITE = 0xFFFFFF;
-    private Path scratch, plugin, out, err;
+    private Path scratch, plugin, log;  // log: the window's output and errors
     private Process live;
     private int shots;
 
@@ -33,8 +33,7 @@ class LiveWindowTest {
     void oneSessionAsAnAuthorKeepsTheWindowOpen() throws Exception {
         scratch = Files.createTempDirectory(Files.createDirectories(property("scratch")), "session-");
         plugin = scratch.resolve("libscene.so");
-        out = scratch.resolve("out.txt");
-        err = scratch.resolve("err.txt");
+        log = scratch.resolve("log.txt");
         Files.copy(property("blue"), plugin);
         // Without a display, status 1 and a hint; for a bad option, status 2.
         String viLive = property("live").toString();
@@ -44,8 +43,8 @@ class LiveWindowTest {
         assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
 
         live = new ProcessBuilder(viLive, "--size", "180x320", plugin.toString())
-            .directory(scratch.toFile()).redirectOutput(out.toFile()).redirectError(err.toFile()).start();
-        awaitText(out, "vi-live: playing");
+            .directory(scratch.toFile()).redirectOutput(log.toFile()).redirectErrorStream(true).start();
+        awaitText("vi-live: playing");
         String window = poll(() -> run("xdotool", "search", "--pid", "" + live.pid()).lines().findFirst()
             .filter(id -> !id.startsWith("status")).orElse(null));
         run("xdotool", "mousemove", "--window", window, "90", "300");
@@ -74,32 +73,31 @@ class LiveWindowTest {
         // After a lost context the frame is the one before, within the golden tolerance.
         run("xdotool", "key", "l");
         assertTrue(GoldenImagesTest.matches(shot(), painted), "after a lost context");
-        assertTrue(Files.readString(out).contains("GL context lost and replaced"));
+        awaitText("GL context lost and replaced");
 
         // A rebuild in another colour replaces the running effect in the same window; builds
         // that do not load leave it running and say why.
-        rebuild(property("orange"), out, "vi-live: reloaded");
+        rebuild(property("orange"), "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
         assertEquals(window + "\nstatus 0", run("xdotool", "search", "--pid", "" + live.pid()), "the same window");
-        rebuild(property("nofactory"), err, "the running effect stays: the library has no \"createScene\"");
-        rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), err, "invalid ELF header");
-        rebuild(property("missingsymbol"), err, "undefined symbol: absentFromEveryLibrary");
+        rebuild(property("nofactory"), "the running effect stays: the library has no \"createScene\"");
+        rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), "invalid ELF header");
+        rebuild(property("missingsymbol"), "undefined symbol: absentFromEveryLibrary");
         poll(() -> run("xdotool", "getwindowname", window).contains("reload failed") ? "" : null);
 
         // Key code 67 would freeze the window for good: refused, and the window goes on.
-        live.getOutputStream().write("keycode 67\n".getBytes(UTF_8));
-        live.getOutputStream().flush();
-        awaitText(err, "key code 67 is refused");
+        live.outputWriter().append("keycode 67\n").flush();
+        awaitText("key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
         run("xdotool", "key", "q");
         assertTrue(live.waitFor(20, TimeUnit.SECONDS), "q did not close the window");
-        assertEquals(0, live.exitValue(), Files.readString(err));
+        assertEquals(0, live.exitValue(), Files.readString(log));
     }
 
     /** A new build lands as a linker writes it, the file rewritten in place; the window tells what it made of it. */
-    private void rebuild(Path library, Path log, String text) throws Exception {
+    private void rebuild(Path library, String text) throws Exception {
         Files.copy(library, plugin, StandardCopyOption.REPLACE_EXISTING);
-        awaitText(log, text);
+        awaitText(text);
     }
 
     /** Presses the screenshot key and reads the picture once it is there. */
@@ -110,8 +108,8 @@ class LiveWindowTest {
         return ImageIO.read(file.toFile());
     }
 
-    private void awaitText(Path file, String text) throws Exception {
-        poll(() -> Files.exists(file) && Files.readString(file).contains(text) ? text : null);
+    private void awaitText(String text) throws Exception {
+        poll(() -> Files.exists(log) && Files.readString(log).contains(text) ? text : null);
     }
 
     /** Polls until the probe gives a value; fails at the deadline, or when the window closes. */
@@ -119,9 +117,9 @@ class LiveWindowTest {
         for (long end = System.currentTimeMillis() + 20_000; System.currentTimeMillis() < end; Thread.sleep(20)) {
             T value = probe.call();
             if (value != null) return value;
-            assertTrue(live.isAlive(), "the window closed: " + Files.readString(err));
+            assertTrue(live.isAlive(), "the window closed: " + Files.readString(log));
         }
-        throw new AssertionError("nothing within 20 s; stderr: " + Files.readString(err));
+        throw new AssertionError("nothing within 20 s; the window said: " + Files.readString(log));
     }
 
     /** Runs a command to its end: its output, then "status N". */
