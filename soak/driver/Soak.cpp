@@ -232,11 +232,8 @@ int main(int argc, char** argv) {
     std::vector<int> only;  // SEQUENCE:i,j,k
     for (std::size_t at = replay.find(':'); at != std::string::npos; at = replay.find(',', at + 1))
         only.push_back(std::atoi(replay.c_str() + at + 1));
-    if (!replay.empty()) {
-        const int replayed = play(seed, std::atoi(replay.c_str()), only, true);  // in this process
-        std::printf("soak: the replay %s\n", replayed ? "failed" : "passed");
-        return replayed;
-    }
+    if (!replay.empty())
+        return play(seed, std::atoi(replay.c_str()), only, true);  // in this process
     const double end = double(std::time(nullptr)) + std::stod(options["--minutes"]) * 60;
     long played = 0, callCount = 0, losses = 0, status = 0;
     for (; !status && played < std::stod(options["--sequences"]) && std::time(nullptr) < end; ++played) {

@@ -85,7 +85,7 @@ private:
     void note(char kind, int a = 0, int b = 0, float x = 0.0f, float y = 0.0f) {
         if (gInside.exchange(1)) ++gTestScene.overlaps;
         std::this_thread::yield();
-        gTestScene.events.push_back({kind, mFactory, a, b, x, y, int(mOrientation), vi::AnimationManager::mNow});
+        gTestScene.events.push_back({kind, mFactory, a, b, int(mOrientation), x, y, vi::AnimationManager::mNow});
         gInside.store(0);
     }
 

@@ -20,10 +20,8 @@
 // normalised point; orientation: the scene's during the call; now:
 // vi::AnimationManager::mNow during the call.
 struct TestSceneEvent {
-    int kind, factory, a, b;
-    float x, y;
-    int orientation;
-    float now;
+    int kind, factory, a, b, orientation;
+    float x, y, now;
 };
 
 struct __attribute__((visibility("default"))) TestSceneState {

@@ -48,17 +48,11 @@ public:
             const std::vector<jint>& ints = self(env).mObjects.at(array)->ints;
             return static_cast<jint*>(self(env).lend(ints.data(), ints.size() * sizeof(jint)));
         };
-        mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray, jint* elements, jint) {
-            self(env).mLeases.erase(elements);
-        };
-        mTable.FindClass = [](JNIEnv* env, const char* name) {
-            return reinterpret_cast<jclass>(self(env).make(name, {}));
-        };
+        mTable.ReleaseIntArrayElements = [](JNIEnv* env, jintArray, jint* p, jint) { self(env).mLeases.erase(p); };
+        mTable.FindClass = [](JNIEnv* env, const char* name) { return jclass(self(env).string(name)); };
         mTable.NewStringUTF = [](JNIEnv* env, const char* chars) { return self(env).string(chars); };
         // An object array keeps nothing: no test reads its elements.
-        mTable.NewObjectArray = [](JNIEnv* env, jsize, jclass, jobject) {
-            return reinterpret_cast<jobjectArray>(self(env).make("", {}));
-        };
+        mTable.NewObjectArray = [](JNIEnv* env, jsize, jclass, jobject) { return jobjectArray(self(env).string("")); };
         mTable.SetObjectArrayElement = [](JNIEnv*, jobjectArray, jsize, jobject) {};
         mEnv.functions = &mTable;
     }
