@@ -57,8 +57,7 @@ const KindInfo kKinds[] = {
     {"clearEffect", 2, VI_NATIVE(prehandleClearEffect), {}}};
 
 struct Call {
-    int kind;
-    int v[4];
+    int kind, v[4];
 };
 
 // Sequence `index` of `seed`, made in full from the two numbers.

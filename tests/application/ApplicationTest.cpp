@@ -10,7 +10,6 @@
 
 #include <algorithm>
 #include <climits>
-#include <functional>
 #include <thread>
 
 #include "Application/AnimationManager.h"
@@ -172,7 +171,7 @@ TEST_F(Handlers, EveryNonZeroOrientationIsTheOneAlternateAndWaitsForItsInitialis
 TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
     const int kCalls = 10000;
     startReady(0, 0, 540, 960);
-    auto run = [](std::function<void(int)> call) {
+    auto run = [](auto call) {
         return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); });
     };
     std::thread threads[] = {run([](int) { App::handleDraw(); }), run([](int) { App::handleDraw(); }),

@@ -10,6 +10,7 @@
 #include <jni.h>
 
 #include <atomic>
+#include <memory>
 #include <thread>
 
 #include "Application/AnimationManager.h"
@@ -46,10 +47,7 @@ public:
         mNames = gTestScene.names;
         note('C', size[0], size[1]);
     }
-    ~RecordingScene() override {
-        note('D');
-        delete mPicture;
-    }
+    ~RecordingScene() override { note('D'); }
 
     void clearEffect() override { note('c'); }
     void affordance() override { note('a'); }
@@ -74,7 +72,7 @@ public:
         // (recycled, it may come back from a lost context undefined).
         auto filed = mNames.empty() ? mTextures->end() : mTextures->find(mNames[0]);
         if (gTestScene.picture && !mPicture && filed != mTextures->end() && filed->second && eglGetCurrentContext())
-            mPicture = new vi::Background(*filed->second);
+            mPicture.reset(new vi::Background(*filed->second));
         if (gTestScene.picture && mPicture && mPicture->drawable.texture->mBuffer) mPicture->renderFrame();
         return gTestScene.drawResult;
     }
@@ -91,7 +89,7 @@ private:
 
     int mFactory;
     vi::TexturesMap* mTextures;
-    vi::Background* mPicture = nullptr;
+    std::unique_ptr<vi::Background> mPicture;
 };
 
 }  // namespace

@@ -56,7 +56,6 @@ public:
         mTable.SetObjectArrayElement = [](JNIEnv*, jobjectArray, jsize, jobject) {};
         mEnv.functions = &mTable;
     }
-    FakeJni(const FakeJni&) = delete;  // nor moved nor assigned: the table points back at this one
 
     JNIEnv* env() { return &mEnv; }
     // Java-side values, alive until reset().

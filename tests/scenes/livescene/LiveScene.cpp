@@ -30,7 +30,6 @@ public:
         return 0;
     }
 
-private:
     std::vector<glm::vec2> mTouches;
 };
 

@@ -25,18 +25,14 @@ class LiveWindowTest {
     private Process live;
     private int shots;
 
-    private static Path property(String name) {
-        return Path.of(System.getProperty("vi." + name));
-    }
-
     @Test
     void oneSessionAsAnAuthorKeepsTheWindowOpen() throws Exception {
-        scratch = Files.createTempDirectory(Files.createDirectories(property("scratch")), "session-");
+        scratch = Files.createTempDirectory(Files.createDirectories(Path.of(System.getProperty("vi.scratch"))), "run-");
         plugin = scratch.resolve("libscene.so");
         log = scratch.resolve("log.txt");
-        Files.copy(property("blue"), plugin);
+        Files.copy(Path.of(System.getProperty("vi.blue")), plugin);
         // Without a display, status 1 and a hint; for a bad option, status 2.
-        String viLive = property("live").toString();
+        String viLive = System.getProperty("vi.live");
         String noDisplay = run("env", "-u", "DISPLAY", "-u", "WAYLAND_DISPLAY", viLive, plugin.toString());
         assertTrue(noDisplay.contains("run it under xvfb-run") && noDisplay.endsWith("status 1"), noDisplay);
         String badOption = run(viLive, "--fps", "30", plugin.toString());
@@ -77,12 +73,13 @@ class LiveWindowTest {
 
         // A rebuild in another colour replaces the running effect in the same window; builds
         // that do not load leave it running and say why.
-        rebuild(property("orange"), "vi-live: reloaded");
+        rebuild(Path.of(System.getProperty("vi.orange")), "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
         assertEquals(window + "\nstatus 0", run("xdotool", "search", "--pid", "" + live.pid()), "the same window");
-        rebuild(property("nofactory"), "the running effect stays: the library has no \"createScene\"");
+        rebuild(Path.of(System.getProperty("vi.nofactory")),
+            "the running effect stays: the library has no \"createScene\"");
         rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), "invalid ELF header");
-        rebuild(property("missingsymbol"), "undefined symbol: absentFromEveryLibrary");
+        rebuild(Path.of(System.getProperty("vi.missingsymbol")), "undefined symbol: absentFromEveryLibrary");
         poll(() -> run("xdotool", "getwindowname", window).contains("reload failed") ? "" : null);
 
         // Key code 67 would freeze the window for good: refused, and the window goes on.
