@@ -171,9 +171,7 @@ TEST_F(Handlers, EveryNonZeroOrientationIsTheOneAlternateAndWaitsForItsInitialis
 TEST_F(Handlers, HandlersOnManyThreadsNeverOverlapInsideTheScene) {
     const int kCalls = 10000;
     startReady(0, 0, 540, 960);
-    auto run = [](auto call) {
-        return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); });
-    };
+    auto run = [](auto call) { return std::thread([call] { for (int i = 0; i < kCalls; ++i) call(i); }); };
     std::thread threads[] = {run([](int) { App::handleDraw(); }), run([](int) { App::handleDraw(); }),
                              run([](int i) { (i % 2 ? App::handleMouseUp : App::handleMouseDown)(i, i); }),
                              run([](int i) { App::handleParam(i, -i); }),

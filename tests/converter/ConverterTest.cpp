@@ -111,6 +111,8 @@ const Case kCases[] = {
      "truncated: 11 bytes, but V = 4294967295 and I = 4294967295 need 146028888038", nullptr},
 };
 
+void PrintTo(const Case& row, std::ostream* out) { *out << row.name; }
+
 class Converter : public testing::TestWithParam<Case> {
 protected:
     void SetUp() override { fs::create_directories(kDir); }
