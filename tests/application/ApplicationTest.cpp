@@ -16,11 +16,11 @@
 #include "Application/Application.h"
 #include "Application/ApplicationVar.h"
 #include "Application/Timer.h"
+#include "FakeJni.h"
 #include "TestSceneRecord.h"
 
-// The host's entry point, called as the JVM would (it reads neither argument).
-extern "C" int Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation(void*, void*, int);
-const auto setOrientation = Java_com_tarq_android_visualeffect_common_Native_prehandleSetOrientation;
+// The host's entry point, called as the JVM would (it reads neither the JNI environment nor the object).
+const auto setOrientation = VI_NATIVE(prehandleSetOrientation);
 
 using namespace vi;
 using App = vi::Application;
@@ -149,6 +149,10 @@ TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
     everyEventButInitialisation();
     App::handleInitEffect();
     EXPECT_TRUE(gTestScene.taken() == "cDC1,1IDC540,960D" && gpScene == nullptr);
+    // Through the host's entry point a start gives the path's chars back (the loader hands over this very copy).
+    vitest::FakeJni jni;
+    EXPECT_NE(VI_NATIVE(prehandleStart)(jni.env(), nullptr, jni.string(VI_TESTSCENE_PATH), 8, 8), nullptr);
+    EXPECT_EQ(jni.outstanding(), 0);
 }
 
 // The host may send any int: every value but 0 is the one alternate
