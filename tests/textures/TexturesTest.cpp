@@ -206,6 +206,8 @@ TEST_F(TexturesTest, TargetAttachesItsTextureOverTheRenderbufferAndDeletesWhatIt
               (Names{"glTexImage2D", "glBindFramebuffer", "glFramebufferRenderbuffer", "glFramebufferTexture2D",
                      "glFramebufferRenderbuffer", "glCheckFramebufferStatus", "glBindFramebuffer"}));
     EXPECT_EQ(argumentOf("glRenderbufferStorage", 1), (Args{GL_RGBA4, GL_DEPTH_COMPONENT16}));
+    // Its storage sets the pack alignment, as every texture's does, on purpose.
+    EXPECT_EQ(argumentOf("glPixelStorei", 0), Args{GL_PACK_ALIGNMENT});
     EXPECT_EQ(argumentOf("glGenRenderbuffers", 0), (Args{1, 1}));  // one name each
     EXPECT_EQ(argumentOf("glBindRenderbuffer", 1),
               (Args{double(target->mColorBuffer), 0, double(target->mDepthBuffer), 0}));
