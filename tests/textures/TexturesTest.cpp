@@ -222,12 +222,14 @@ TEST_F(TexturesTest, TargetAttachesItsTextureOverTheRenderbufferAndDeletesWhatIt
     EXPECT_EQ(deleted, names);
 
     // After a lost context its old names may be another object's: a target
-    // destroyed before it was made again deletes nothing.
+    // destroyed before it was made again deletes nothing. A pass of a target
+    // without renderers draws nothing.
     target = new RenderableTexture(0, 0, 4, 4, false, false, false, false, true);
     target->allocate();
     mContext.recreate();
     target->contextChanged();
     GlRecorder::start();
+    target->renderFrame();
     delete target;
     EXPECT_EQ(GlRecorder::names(), Names{});
 }
@@ -287,6 +289,7 @@ TEST_F(TexturesTest, WrittenPixelsReadBackFromTheTargetsPositionAndAClearInsideA
     origin.readBuffer(back.data());
     EXPECT_EQ(back, pattern);
     EXPECT_EQ(argumentOf("glPixelStorei", 0), (Args{GL_PACK_ALIGNMENT, GL_UNPACK_ALIGNMENT}));
+    EXPECT_EQ(argumentOf("glPixelStorei", 1), (Args{1, 1}));
     offset.writeBuffer(pattern.data());
     GlRecorder::start();
     offset.readBuffer(back.data());
