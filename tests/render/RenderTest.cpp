@@ -207,6 +207,7 @@ TEST_F(RenderTest, DynamicArraysAndChangedIndicesGoUpAtTheDrawStaticOnesOnceAndD
     EXPECT_EQ(made[0].args, (Args{GL_ELEMENT_ARRAY_BUFFER, 12, address(indices), GL_STATIC_DRAW}));
     EXPECT_EQ(made[1].args, (Args{GL_ARRAY_BUFFER, 64, address(positions), GL_STATIC_DRAW}));
     EXPECT_EQ(made[2].args, (Args{GL_ARRAY_BUFFER, 32, address(offsets), GL_STREAM_DRAW}));
+    EXPECT_EQ(GlRecorder::count("glVertexAttribPointer"), 2) << "each array is pointed at as it is made";
     GlRecorder::start();
     renderer->render();
     EXPECT_EQ(GlRecorder::names(), (Names{"glUseProgram", "glBindBuffer", "glVertexAttribPointer", "glBindBuffer",
