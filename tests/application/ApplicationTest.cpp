@@ -129,10 +129,14 @@ TEST_F(Handlers, StartInitRestartAndStopAndOnlyAReadySceneHearsAnything) {
     for (void (*event)() : {App::handleAffordance, App::handleUnlock}) event();
     App::handleParam(-5, 123456789);
     App::handleKey(1000);
+    // The host's menu and volume keys are key codes 0, 1 and 2; each entry point answers 0.
+    for (auto key : {VI_NATIVE(prehandleMenuPressed), VI_NATIVE(prehandleVolumeUpPressed),
+                     VI_NATIVE(prehandleVolumeDownPressed)})
+        EXPECT_EQ(key(nullptr, nullptr), 0);
     App::handleMouseMove(5, 7);  // the window's top left corner
     EXPECT_EQ(App::handleDraw(), 3);
     for (const TestSceneEvent& e : gTestScene.events) EXPECT_GE(e.now, 0.0f) << "the clock first";
-    EXPECT_EQ(gTestScene.taken(), "Icalp-5,123456789k1000m(0.000000,1.000000)F");
+    EXPECT_EQ(gTestScene.taken(), "Icalp-5,123456789k1000k0k1k2m(0.000000,1.000000)F");
     // The host moves the window: no lock, and no word to the scene.
     App::handleWindowRectangle(-3, -4, 0, -20);
     EXPECT_TRUE(window() == (Ints{-3, -4, 1, 1}) && gpScene->mSize == glm::vec2(1.0f) && gTestScene.taken().empty());
