@@ -186,6 +186,7 @@ TEST_F(RenderTest, StandardUniformsAndSamplersAreBoundByNameAndReadAtEachDraw) {
                     uniformFloats(p, "uModelViewProjectionMatrix", 16)[14], uniformFloats(p, "uFirstTexelSize", 2)[1],
                     uniformFloats(p, "uSecondTexelSize", 2)[1]}),
               (Args{0.5, drawable.normalMatrix[2][2], 1, 0.25, drawable.modelViewProjectionMatrix[3][2], 0.5, 0.125}));
+    EXPECT_EQ(uniformFloats(p, "uFirstSize", 2), (std::vector<float>{4, 2}));
     // Samplers take the units in the order they were added.
     EXPECT_EQ(Args({uniformFloats(p, "uFirst", 1)[0], uniformFloats(p, "uSecond", 1)[0]}), (Args{0, 1}));
 }
