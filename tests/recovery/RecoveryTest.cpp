@@ -21,9 +21,8 @@
 #include "TestSceneRecord.h"
 
 extern "C" void __real_free(void* p);
-double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
 extern "C" void __wrap_free(void* p) {
-    if (p) vitest::GlRecorder::record("free", {address(p)});
+    if (p) vitest::GlRecorder::record("free", {vitest::address(p)});
     __real_free(p);
 }
 

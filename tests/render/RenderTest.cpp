@@ -16,6 +16,7 @@
 #include "Tools/FatalReport.h"
 
 using vitest::GlCall;
+using vitest::address;
 using vitest::GlRecorder;
 using Args = std::vector<double>;
 using Names = std::vector<std::string>;
@@ -29,7 +30,6 @@ const char* const kVertex =
 const char* const kFragment =
     "precision mediump float;\nvarying vec2 vValue;\nvoid main() { gl_FragColor = vec4(vValue, 0.0, 1.0); }\n";
 
-double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
 
 std::vector<float> uniformFloats(GLuint program, const char* name, int n) {
     std::vector<float> values(16, -99.0f);

@@ -5,10 +5,14 @@
 // call of the functions wrapped in GlRecorder.cpp through -Wl,--wrap wrappers
 // that call the driver and then append the call to a log.
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
 namespace vitest {
+
+// A pointer argument as the log keeps it.
+inline double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
 
 struct GlCall {
     std::string name;          // "glTexImage2D"

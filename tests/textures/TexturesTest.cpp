@@ -20,6 +20,7 @@
 
 using vi::RenderableTexture;
 using vitest::GlCall;
+using vitest::address;
 using vitest::GlRecorder;
 using vitest::GlRecording;
 using Args = std::vector<double>;
@@ -36,7 +37,6 @@ namespace {
 
 constexpr std::uint32_t kRed = 0xFF0000FF, kGreen = 0x00FF00FF;
 
-double address(const void* p) { return double(reinterpret_cast<std::uintptr_t>(p)); }
 
 // Argument `index` of every recorded call of `name` (negative: from the end).
 Args argumentOf(const std::string& name, int index) {
