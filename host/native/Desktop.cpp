@@ -2,7 +2,8 @@
 // desktop does not. A headless EGL surface kept current on the calling thread
 // (the player's render thread), the current surface's pixels, any key code,
 // the plug-in's asset directory, the window rectangle, why a plug-in does not
-// load, and the preloaded clock. The live window uses all but the surface.
+// load, the preloaded clock, and the message when the effect ends the process.
+// The live window uses all but the surface.
 #include <EGL/egl.h>
 #include <EGL/eglext.h>
 #include <GLES2/gl2.h>
@@ -14,6 +15,7 @@
 #include <vector>
 
 #include "Application/Application.h"
+#include "FatalExit.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/File.h"
 
@@ -136,7 +138,20 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(sendKey)(JNIEnv*, jclass, jint code) {
 JNIEXPORT void JNICALL DESKTOP_NATIVE(setAssetDirectory)(JNIEnv* env, jclass, jstring directory) {
     const char* chars = env->GetStringUTFChars(directory, nullptr);
     vi::File::getAssetManager() = vi::DirectoryAssetManager::create(chars);
+    FatalExit::setAssetDirectory(chars);
     env->ReleaseStringUTFChars(directory, chars);
+}
+
+JNIEXPORT void JNICALL DESKTOP_NATIVE(explainFatalExits)(JNIEnv* env, jclass, jstring program) {
+    const char* chars = env->GetStringUTFChars(program, nullptr);
+    FatalExit::watch(chars);
+    env->ReleaseStringUTFChars(program, chars);
+}
+
+JNIEXPORT void JNICALL DESKTOP_NATIVE(removeOnFatalExit)(JNIEnv* env, jclass, jstring path) {
+    const char* chars = env->GetStringUTFChars(path, nullptr);
+    FatalExit::removeOnFatalExit(chars);
+    env->ReleaseStringUTFChars(path, chars);
 }
 
 JNIEXPORT void JNICALL DESKTOP_NATIVE(setWindowRectangle)(JNIEnv*, jclass, jint left, jint top, jint width,

@@ -21,6 +21,14 @@ public:
     // The manager lives until destroy(); it is never freed by the runtime.
     static AAssetManager* create(const std::string& directory);
     static void destroy(AAssetManager* manager);
+
+    // What the asset name finds in the directory. A phone's package holds
+    // nothing but its assets, so a name never reaches beyond the folder here
+    // either: an absolute name, "../x" or a symbolic link pointing out is no
+    // asset. The desktop hosts ask this to say why an asset was not found.
+    enum class Lookup { Found, Missing, Outside, NotAFile };
+    // On Found, `path` is the file's real path (no symbolic links left).
+    static Lookup find(const std::string& directory, const char* name, std::string& path);
 };
 
 }  // namespace vi

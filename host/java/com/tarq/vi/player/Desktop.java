@@ -3,7 +3,8 @@ package com.tarq.vi.player;
 /**
  * What a phone gives its host and a desktop does not: a headless GL surface
  * current on the calling thread, the current surface's pixels, any key code, the plug-in's asset directory,
- * the window rectangle, why a plug-in does not load, and the preloaded clock.
+ * the window rectangle, why a plug-in does not load, the preloaded clock, and the
+ * message when the effect ends the process.
  * Every method must be called on the thread that opened the surface.
  */
 final class Desktop {
@@ -24,6 +25,17 @@ final class Desktop {
     static native void sendKey(int code);
 
     static native void setAssetDirectory(String directory);
+
+    /**
+     * From now on, when the effect ends the process through the runtime's
+     * fatal report (exit 88, 67, 71 or 45), the report is told on standard
+     * error, each line starting with the program's name, by an exit handler
+     * that never calls back into Java.
+     */
+    static native void explainFatalExits(String program);
+
+    /** A file or folder the exit handler removes if the effect ends the process. */
+    static native void removeOnFatalExit(String path);
 
     static native void setWindowRectangle(int left, int top, int width, int height);
 

@@ -93,6 +93,7 @@ public final class Live implements Session.Surface {
         }
         Path assets = Session.assetDirectory(plugin, options.assets);
         Session.loadLibraries("vi-live", "vi.window");
+        Desktop.explainFatalExits("vi-live");
         if (!Desktop.setClock(Player.FIXED_CLOCK_START)) {
             throw new Failure("the clock library is not preloaded; start it with vi-live");
         }
@@ -101,10 +102,14 @@ public final class Live implements Session.Surface {
             if (assets != null) Desktop.setAssetDirectory(assets.toString());
             watch = new PluginWatch(plugin, assets);
             running = watch.copy();
-            if (!session.start(running.toString(), false)) {
-                String reason = Desktop.whyNotLoadable(running.toString());
-                throw new Failure("cannot start the effect in " + options.plugin + ": "
-                    + (reason != null ? reason : "the runtime refused it"));
+            try {
+                if (!session.start(running.toString(), false)) {
+                    String reason = Desktop.whyNotLoadable(running.toString());
+                    throw new Failure("cannot start the effect in " + options.plugin + ": "
+                        + (reason != null ? reason : "the runtime refused it"));
+                }
+            } finally {
+                PluginWatch.discard(running);
             }
             System.out.printf("vi-live: playing %s in a %dx%d window; h for the keys%n", options.plugin,
                 session.width(), session.height());
@@ -113,7 +118,6 @@ public final class Live implements Session.Surface {
             host.prehandleStop();
         } finally {
             Window.close();
-            if (watch != null) watch.close();
         }
         frameTimes.reportForBench();
     }
@@ -224,13 +228,16 @@ public final class Live implements Session.Surface {
             copy = null;
             reason = "cannot copy it: " + e.getMessage();
         }
-        if (copy != null && reason == null && session.start(copy.toString(), true)) {
+        boolean started = copy != null && reason == null && session.start(copy.toString(), true);
+        if (copy != null) PluginWatch.discard(copy);
+        if (started) {
             running = copy;
             lastReload = "reloaded " + LocalTime.now().format(CLOCK);
             System.out.println("vi-live: reloaded " + options.plugin);
             System.out.flush();
         } else {
             if (reason == null) {
+                // The running copy is gone from the disk, but the loader still holds it under its path.
                 reason = "the runtime refused it";
                 session.start(running.toString(), true);
             }

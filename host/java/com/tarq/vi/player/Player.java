@@ -26,6 +26,10 @@ public final class Player {
     private final Options options;
     private final Session session;
     private final Native host;
+    /** Held while writing into the partial folder, and by the shutdown hook that removes it. */
+    private final Object partialLock = new Object();
+    /** Set by the shutdown hook (Ctrl-C, SIGTERM) once it has removed the partial folder. */
+    private boolean abandoned;
 
     private Player(Options options) {
         this.options = options;
@@ -83,16 +87,22 @@ public final class Player {
         int frames = Math.max(1, (int) Math.round(duration * options.fps));
         Path partial = out.resolveSibling("." + out.getFileName() + ".partial-" + ProcessHandle.current().pid());
         Files.createDirectories(partial);
+        Runtime.getRuntime().addShutdownHook(new Thread(() -> abandon(partial)));
         try {
             Files.createFile(partial.resolve(MARK));
             try (Pictures pictures = new Pictures(partial, options.width, options.height, options.fps, frames,
                     options.sheetFrames)) {
-                play(plugin, timeline, frames, pictures);
-                pictures.finish();
+                play(plugin, timeline, frames, pictures, partial);
+                synchronized (partialLock) {
+                    stopIfAbandoned();
+                    pictures.finish();
+                    replace(out, partial);
+                }
             }
-            replace(out, partial);
         } finally {
-            deleteTree(partial);
+            synchronized (partialLock) {
+                deleteTree(partial);
+            }
         }
         System.out.printf(Locale.ROOT, "frames:        %s (%s .. %s, %d frames at %d fps%s)%n", out,
             Pictures.frameName(0), Pictures.frameName(frames - 1), frames, options.fps,
@@ -101,8 +111,11 @@ public final class Player {
         System.out.println("preview:       " + out.resolve(Pictures.PREVIEW));
     }
 
-    private void play(Path plugin, Timeline timeline, int frames, Pictures pictures) throws Failure, IOException {
+    private void play(Path plugin, Timeline timeline, int frames, Pictures pictures, Path partial)
+            throws Failure, IOException {
         Session.loadLibraries("vi-player");
+        Desktop.explainFatalExits("vi-player");
+        Desktop.removeOnFatalExit(partial.toString());
         Desktop.open(options.width, options.height);
         if (options.fixedStep && !Desktop.setClock(FIXED_CLOCK_START)) {
             throw new Failure("--fixed-step needs the player's clock library preloaded; start it with vi-player");
@@ -137,7 +150,10 @@ public final class Player {
             host.prehandleDraw();
             BufferedImage image = session.readFrame();
             frameTimes.add(System.nanoTime() - drawn);
-            pictures.add(frame, seconds, image);
+            synchronized (partialLock) {
+                stopIfAbandoned();
+                pictures.add(frame, seconds, image);
+            }
             progress.frameDone(frame);
         }
         host.prehandleStop();
@@ -170,6 +186,34 @@ public final class Player {
             Thread.sleep(wait / 1_000_000, (int) (wait % 1_000_000));
         } catch (InterruptedException e) {
             Thread.currentThread().interrupt();
+        }
+    }
+
+    /** Ctrl-C or SIGTERM: the partial folder goes, and nothing is written after. */
+    private void abandon(Path partial) {
+        synchronized (partialLock) {
+            abandoned = true;
+            try {
+                deleteTree(partial);
+            } catch (IOException e) {
+                System.err.println("vi-player: cannot remove " + partial + ": " + e.getMessage());
+            }
+        }
+    }
+
+    /**
+     * Called holding the lock before each write. Once the hook has run, the
+     * JVM halts as soon as the hooks are done: this thread waits for that
+     * rather than write into a folder that is gone or report it as a failure.
+     */
+    private void stopIfAbandoned() {
+        while (abandoned) {
+            try {
+                partialLock.wait();
+            } catch (InterruptedException e) {
+                Thread.currentThread().interrupt();
+                return;
+            }
         }
     }
 

@@ -3,9 +3,7 @@ package com.tarq.vi.player;
 import java.io.IOException;
 import java.nio.file.Files;
 import java.nio.file.Path;
-import java.nio.file.StandardCopyOption;
 import java.nio.file.attribute.BasicFileAttributes;
-import java.util.Comparator;
 import java.util.Objects;
 import java.util.stream.Stream;
 
@@ -13,16 +11,17 @@ import java.util.stream.Stream;
  * Watches the plug-in file and its asset folder for a new build, and copies
  * the plug-in to a fresh path for each load: the runtime never opens a path
  * it has loaded again, and a build must not rewrite the library the effect
- * runs from. Owns the folder of copies, deleted by close().
+ * runs from. Each copy lives in a private folder of its own only until the
+ * runtime has opened it (discard()): a mapped library needs no file, and so
+ * not even a killed window leaves copies behind.
  */
-final class PluginWatch implements AutoCloseable {
+final class PluginWatch {
     /** A change counts once the files have stayed as they are this long. */
     private static final long SETTLE_NANOS = 300_000_000L;
     private static final long LOOK_EVERY_NANOS = 100_000_000L;
 
     private final Path plugin;
     private final Path assets;
-    private final Path copies;
     private int copied;
     private String loaded;
     private String seen;
@@ -32,16 +31,34 @@ final class PluginWatch implements AutoCloseable {
     PluginWatch(Path plugin, Path assets) throws IOException {
         this.plugin = plugin;
         this.assets = assets;
-        copies = Files.createTempDirectory("vi-live-");
         loaded = signature();
         seen = loaded;
     }
 
-    /** A copy of the plug-in as it is now, at a path never used before. */
+    /**
+     * A copy of the plug-in as it is now, at a path never used before; removed
+     * by the exit handler too, should the effect end the process while starting.
+     */
     Path copy() throws IOException {
-        Path copy = copies.resolve(++copied + "-" + plugin.getFileName());
-        Files.copy(plugin, copy, StandardCopyOption.REPLACE_EXISTING);
+        Path copy = Files.createTempDirectory("vi-live-").resolve(++copied + "-" + plugin.getFileName());
+        Desktop.removeOnFatalExit(copy.getParent().toString());
+        try {
+            Files.copy(plugin, copy);
+        } catch (IOException e) {
+            discard(copy);
+            throw e;
+        }
         return copy;
+    }
+
+    /** Removes a copy and its folder, once the runtime has opened it or refused it. */
+    static void discard(Path copy) {
+        try {
+            Files.deleteIfExists(copy);
+            Files.deleteIfExists(copy.getParent());
+        } catch (IOException e) {
+            System.err.println("vi-live: cannot remove the plug-in's copy " + copy + ": " + e.getMessage());
+        }
     }
 
     /** True once the files differ from those last loaded and have settled; looks at most ten times a second. */
@@ -61,13 +78,6 @@ final class PluginWatch implements AutoCloseable {
     void markLoaded() {
         loaded = signature();
         seen = loaded;
-    }
-
-    @Override
-    public void close() throws IOException {
-        try (Stream<Path> paths = Files.walk(copies)) {
-            for (Path path : paths.sorted(Comparator.reverseOrder()).toList()) Files.deleteIfExists(path);
-        }
     }
 
     /** The plug-in's size and time and every asset's; empty while the plug-in is missing (a build under way). */

@@ -1,0 +1,45 @@
+// An effect that makes one author's mistake as it starts, chosen at build
+// time: MISTAKE_SHADER (a fragment shader that does not compile),
+// MISTAKE_LINK (a varying the vertex shader never writes), MISTAKE_ASSET or
+// MISTAKE_FILE (the name of an asset or a file to read). Without one it draws
+// a colour, for as long as the host lets it.
+#include <GLES2/gl2.h>
+
+#include "Application/Scene.h"
+#include "Render/ShaderProgram.h"
+#include "Tools/File.h"
+
+namespace {
+
+const char* const kVertex = "attribute vec4 aPosition;\nvoid main() {\n    gl_Position = aPosition;\n}\n";
+const char* const kFragment =
+#if defined(MISTAKE_SHADER)
+    "precision mediump float;\nvoid main() {\n    gl_FragColor = vec4(0.2, 0.3, 0.4 1.0);\n}\n";
+#else
+    "precision mediump float;\nvarying vec2 vGlow;\nvoid main() {\n    gl_FragColor = vec4(vGlow, 0.4, 1.0);\n}\n";
+#endif
+
+class Mistake : public vi::Scene {
+public:
+    explicit Mistake(const int* size) : vi::Scene(size) {
+#if defined(MISTAKE_SHADER) || defined(MISTAKE_LINK)
+        new vi::ShaderProgram(kVertex, kFragment);
+#elif defined(MISTAKE_ASSET)
+        vi::File(MISTAKE_ASSET, true);
+#elif defined(MISTAKE_FILE)
+        vi::File(MISTAKE_FILE, false);
+#endif
+    }
+
+    int draw() override {
+        glClearColor(0.2f, 0.3f, 0.4f, 1.0f);
+        glClear(GL_COLOR_BUFFER_BIT);
+        return 0;
+    }
+};
+
+}  // namespace
+
+extern "C" __attribute__((visibility("default"))) vi::Scene* createScene(int* size, vi::ModelsMap*, vi::TexturesMap*) {
+    return new Mistake(size);
+}
