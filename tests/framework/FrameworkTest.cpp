@@ -132,6 +132,32 @@ TEST(File, LoadTakesTheWholeFileAndWritesCollectUntilAFlushThatAlwaysEmptiesTheB
     EXPECT_EQ(file.getLength(), 0u);
 }
 
+TEST(File, AnAssetNameNeverLeavesTheAssetFolder) {
+    AssetDirectory assets;
+    assets.write("in/a.bin", "a");
+    assets.write("in/sub/b.bin", "b");
+    assets.write("secret", "s");  // beside the asset folder
+    std::filesystem::create_symlink("../secret", assets.pathOf("in/out-link"));
+    std::filesystem::create_symlink("sub/b.bin", assets.pathOf("in/in-link"));
+    using Lookup = vi::DirectoryAssetManager::Lookup;
+    const std::pair<std::string, Lookup> rows[] = {
+        {"a.bin", Lookup::Found},         {"sub/../a.bin", Lookup::Found},      {"./sub//b.bin", Lookup::Found},
+        {"in-link", Lookup::Found},       {"../secret", Lookup::Outside},       {"sub/../../secret", Lookup::Outside},
+        {"out-link", Lookup::Outside},    {assets.pathOf("in/a.bin"), Lookup::Outside}, {"../in/a.bin", Lookup::Outside},
+        {"ghost.bin", Lookup::Missing},   {"sub", Lookup::NotAFile}};
+    for (const auto& [name, expected] : rows) {
+        std::string path;
+        EXPECT_EQ(vi::DirectoryAssetManager::find(assets.pathOf("in"), name.c_str(), path), expected) << name;
+    }
+    AAssetManager* manager = vi::DirectoryAssetManager::create(assets.pathOf("in"));
+    EXPECT_EQ(AAssetManager_open(manager, "out-link", 0), nullptr);
+    AAsset* linked = AAssetManager_open(manager, "in-link", 0);
+    ASSERT_NE(linked, nullptr);
+    EXPECT_EQ(AAsset_getLength(linked), 1);
+    AAsset_close(linked);
+    vi::DirectoryAssetManager::destroy(manager);
+}
+
 TEST_F(Framework, ModelsFillDrawablesInPlaceAndALitModelShowsTheFactorsWhereItsVerticesAreScaledOrNot) {
     AssetDirectory assets;
     assets.write("triangle.bin", modelFile({0, 0, 0, 1, 0, 0, 0, 1, 0}, Floats(9, 0.5f), Floats(6, 0), {}));

@@ -1,12 +1,13 @@
 #!/usr/bin/env bash
-# The player's failures as a user meets them: for each kind of bad input its
-# status, a message naming the problem, and no output folder (nor a partial
-# one) left behind.
-# usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR
+# The player's failures as a user meets them: for each kind of bad input, and
+# each mistake that ends the effect, its status, the message's key words
+# ('^' between them), and no output folder (nor a partial one) left behind.
+# usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR MISTAKE_PLUGINS_DIR
 set -uo pipefail
-player="$1" plugin="$2" nofactory="$3"
-rm -rf "$4" && mkdir -p "$4" && cd "$4" || exit 1
+player="$1" plugin="$2" nofactory="$3" m="$5"
+rm -rf "$4" && mkdir -p "$4/assets" && cd "$4" || exit 1
 echo "not a picture" | tee broken.png > libgarbage.so
+echo "beside the asset folder" > secret
 failures=0 n=0
 fail() { echo "FAIL ($args): $*"; cat stderr.txt; failures=$((failures + 1)); }
 
@@ -15,8 +16,8 @@ while IFS=';' read -r status message args; do
   # shellcheck disable=SC2086  # the arguments are words
   "$player" --quiet --out result $args > /dev/null 2> stderr.txt || actual=$?
   [ "$actual" -eq "$status" ] || fail "status $actual, expected $status"
-  grep -qF -- "$message" stderr.txt || fail "no \"$message\""
-  if [ -e result ] || ls -A | grep -q '^\.result\.'; then fail "output left behind"; fi
+  while read -r -d '^' part; do grep -qF -- "$part" stderr.txt || fail "no \"$part\""; done <<< "$message^"
+  if [ -e result ] || compgen -G '.result.*' > /dev/null; then fail "output left behind"; fi
   rm -rf result .result.*
 done < <(cat <<ROWS
 1;plug-in not found: missing/libnone.so;missing/libnone.so
@@ -30,6 +31,11 @@ done < <(cat <<ROWS
 2;no plug-in given;--fixed-step
 2;--fps takes a whole number from 1 to 240, not "0";--fps 0 $plugin
 2;--image takes NAME=FILE;--image wallpaper $plugin
+88;error: the fragment shader does not compile (the effect ended with status 88)^shader line 3:     gl_FragColor = vec4(0.2, 0.3, 0.4 1.0);$m/libvi_mistake_shader.so
+67;error: the shader program does not link (the effect ended with status 67)^vGlow;$m/libvi_mistake_link.so
+71;asset that does not exist (the effect ended with status 71)^ghost.bin, searched in $(pwd -P)/assets;--assets assets $m/libvi_mistake_ghost.so
+71;asset outside its asset folder (the effect ended with status 71)^../secret leads out of $(pwd -P)/assets;--assets assets $m/libvi_mistake_secret.so
+45;could not open a file (the effect ended with status 45)^nowhere.txt, searched in $(pwd -P);$m/libvi_mistake_file.so
 ROWS
 # Each kind of bad timeline line, after a comment and a good event: the file, the line and the problem.
 while IFS='|' read -r line message; do
@@ -47,6 +53,18 @@ NaN unlock|3: "NaN" is not a time in seconds
 1 image wallpaper missing.png|3: cannot read image
 LINES
 )
+
+# Ctrl-C or SIGTERM once the output folder is being written: the signal's status, nothing left behind.
+for signal in INT TERM; do
+  args="SIG$signal"
+  env --default-signal=INT "$player" --quiet --out result --duration 60 "$m/libvi_mistake_none.so" 2> stderr.txt &
+  for _ in $(seq 300); do compgen -G '.result.partial-*' > /dev/null && break; sleep 0.1; done
+  compgen -G '.result.partial-*' > /dev/null || fail "no output folder within 30 s"
+  kill -s "$signal" $! && wait $!
+  actual=$?
+  [ "$actual" -eq $((128 + $(kill -l "$signal"))) ] || fail "status $actual"
+  if [ -e result ] || compgen -G '.result.*' > /dev/null; then fail "output left behind"; fi
+done
 
 # A folder the player did not write is never replaced; the usage asked for is no failure.
 mkdir -p result && touch result/keep

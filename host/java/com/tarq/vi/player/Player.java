@@ -86,8 +86,9 @@ public final class Player {
         double duration = duration(timeline);
         int frames = Math.max(1, (int) Math.round(duration * options.fps));
         Path partial = out.resolveSibling("." + out.getFileName() + ".partial-" + ProcessHandle.current().pid());
-        Files.createDirectories(partial);
+        // The hook first, so that no signal finds the folder without it.
         Runtime.getRuntime().addShutdownHook(new Thread(() -> abandon(partial)));
+        Files.createDirectories(partial);
         try {
             Files.createFile(partial.resolve(MARK));
             try (Pictures pictures = new Pictures(partial, options.width, options.height, options.fps, frames,

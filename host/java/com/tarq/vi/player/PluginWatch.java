@@ -40,7 +40,8 @@ final class PluginWatch {
      * by the exit handler too, should the effect end the process while starting.
      */
     Path copy() throws IOException {
-        Path copy = Files.createTempDirectory("vi-live-").resolve(++copied + "-" + plugin.getFileName());
+        String folder = "vi-live-" + ProcessHandle.current().pid() + "-";
+        Path copy = Files.createTempDirectory(folder).resolve(++copied + "-" + plugin.getFileName());
         Desktop.removeOnFatalExit(copy.getParent().toString());
         try {
             Files.copy(plugin, copy);

@@ -10,6 +10,7 @@ import java.nio.file.StandardCopyOption;
 import java.util.List;
 import java.util.concurrent.Callable;
 import java.util.concurrent.TimeUnit;
+import java.util.stream.Stream;
 import javax.imageio.ImageIO;
 import org.junit.jupiter.api.Test;
 
@@ -76,6 +77,10 @@ class LiveWindowTest {
         rebuild(Path.of(System.getProperty("vi.orange")), "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
         assertEquals(window + "\nstatus 0", run("xdotool", "search", "--pid", "" + live.pid()), "the same window");
+        try (Stream<Path> temporary = Files.list(Path.of(System.getProperty("java.io.tmpdir")))) {
+            String copies = "vi-live-" + live.pid() + "-";  // the running effect's copy is gone once loaded
+            assertEquals(List.of(), temporary.filter(p -> p.getFileName().toString().startsWith(copies)).toList());
+        }
         rebuild(Path.of(System.getProperty("vi.nofactory")),
             "the running effect stays: the library has no \"createScene\"");
         rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), "invalid ELF header");
