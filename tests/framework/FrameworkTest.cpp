@@ -136,19 +136,23 @@ TEST(File, AnAssetNameNeverLeavesTheAssetFolder) {
     AssetDirectory assets;
     assets.write("in/a.bin", "a");
     assets.write("in/sub/b.bin", "b");
-    assets.write("secret", "s");  // beside the asset folder
+    assets.write("secret", "s");       // beside the asset folder
+    assets.write("in2/c.bin", "c");    // next door, its name starting as the folder's
     std::filesystem::create_symlink("../secret", assets.pathOf("in/out-link"));
+    std::filesystem::create_symlink("../in2/c.bin", assets.pathOf("in/next-door"));
     std::filesystem::create_symlink("sub/b.bin", assets.pathOf("in/in-link"));
     using Lookup = vi::DirectoryAssetManager::Lookup;
     const std::pair<std::string, Lookup> rows[] = {
         {"a.bin", Lookup::Found},         {"sub/../a.bin", Lookup::Found},      {"./sub//b.bin", Lookup::Found},
         {"in-link", Lookup::Found},       {"../secret", Lookup::Outside},       {"sub/../../secret", Lookup::Outside},
         {"out-link", Lookup::Outside},    {assets.pathOf("in/a.bin"), Lookup::Outside}, {"../in/a.bin", Lookup::Outside},
+        {"next-door", Lookup::Outside},   {"./../ghost.bin", Lookup::Outside},  {".x/../ghost.bin", Lookup::Missing},
         {"ghost.bin", Lookup::Missing},   {"sub", Lookup::NotAFile}};
     for (const auto& [name, expected] : rows) {
         std::string path;
         EXPECT_EQ(vi::DirectoryAssetManager::find(assets.pathOf("in"), name.c_str(), path), expected) << name;
     }
+    EXPECT_EQ(AAssetManager_open(nullptr, "a.bin", 0), nullptr);  // no asset folder: no asset
     AAssetManager* manager = vi::DirectoryAssetManager::create(assets.pathOf("in"));
     EXPECT_EQ(AAssetManager_open(manager, "out-link", 0), nullptr);
     AAsset* linked = AAssetManager_open(manager, "in-link", 0);
