@@ -73,6 +73,8 @@ void FatalExit::setAssetDirectory(const std::string& directory) { gAssetDirector
 
 void FatalExit::removeOnFatalExit(const std::string& path) { gRemoveOnExit.push_back(path); }
 
+// Runs on the thread that called exit(): for a report, the GL thread, still
+// inside the failing function, whose frame (and the report in it) exit() never leaves.
 void FatalExit::onExit() {
     const std::string* report = vi::FatalReport::msLastReport;
     if (!report) return;

@@ -28,9 +28,8 @@ final class Desktop {
 
     /**
      * From now on, when the effect ends the process through the runtime's
-     * fatal report (exit 88, 67, 71 or 45), the report is told on standard
-     * error, each line starting with the program's name, by an exit handler
-     * that never calls back into Java.
+     * fatal report (exit 88, 67, 71 or 45), an exit handler that never calls
+     * back into Java tells it on standard error, as "PROGRAM: error: ...".
      */
     static native void explainFatalExits(String program);
 
