@@ -28,7 +28,7 @@ final class PluginWatch {
     private long seenSince;
     private long lastLook;
 
-    PluginWatch(Path plugin, Path assets) throws IOException {
+    PluginWatch(Path plugin, Path assets) {
         this.plugin = plugin;
         this.assets = assets;
         loaded = signature();
