@@ -86,13 +86,19 @@ public final class Player {
         double duration = duration(timeline);
         int frames = Math.max(1, (int) Math.round(duration * options.fps));
         Path partial = out.resolveSibling("." + out.getFileName() + ".partial-" + ProcessHandle.current().pid());
-        // The hook first, so that no signal finds the folder without it.
+        // The hook first, so that no signal finds the folder without it; every
+        // write into the folder, its making included, holds the hook's lock.
         Runtime.getRuntime().addShutdownHook(new Thread(() -> abandon(partial)));
-        Files.createDirectories(partial);
         try {
-            Files.createFile(partial.resolve(MARK));
-            try (Pictures pictures = new Pictures(partial, options.width, options.height, options.fps, frames,
-                    options.sheetFrames)) {
+            Pictures pictures;
+            synchronized (partialLock) {
+                stopIfAbandoned();
+                Files.createDirectories(partial);
+                Files.createFile(partial.resolve(MARK));
+                pictures = new Pictures(partial, options.width, options.height, options.fps, frames,
+                    options.sheetFrames);
+            }
+            try (pictures) {
                 play(plugin, timeline, frames, pictures, partial);
                 synchronized (partialLock) {
                     stopIfAbandoned();
