@@ -57,6 +57,11 @@ std::string indented(const std::string& text) {
     return result;
 }
 
+// The first line of every message: what happened, and the runtime's status.
+std::string headline(const std::string& what, int status) {
+    return gProgram + ": error: " + what + " (the effect ended with status " + std::to_string(status) + ")\n";
+}
+
 int removeOne(const char* path, const struct stat*, int, struct FTW*) {
     std::remove(path);
     return 0;
@@ -93,15 +98,13 @@ void FatalExit::onExit() {
 
 std::string FatalExit::explain(const std::string& detail, const std::string& function, int status) {
     if (function == "compileShader") return explainShader(detail, status);
-    const std::string prefix = gProgram + ": error: ";
-    const std::string ended = " (the effect ended with status " + std::to_string(status) + ")\n";
-    if (function == "init") return prefix + "the shader program does not link" + ended + indented(detail);
+    if (function == "init") return headline("the shader program does not link", status) + indented(detail);
     const bool isAsset = function == "load";
     if ((isAsset || function == "File") && detail.compare(0, sizeof(kFileNameMark) - 1, kFileNameMark) == 0) {
         const std::size_t start = sizeof(kFileNameMark) - 1;
         return explainFile(detail.substr(start, detail.size() - start - 1), isAsset, status);
     }
-    return prefix + "the effect ended" + ended + indented(detail);
+    return headline("the effect ended", status) + indented(detail);
 }
 
 // The driver's log as it is; after each line that names a line of the shader, that line.
@@ -112,8 +115,7 @@ std::string FatalExit::explainShader(const std::string& log, int status) {
     const char* source = lastSource ? lastSource(&type) : nullptr;
     const char* which = type == GL_VERTEX_SHADER ? "the vertex shader" : type == GL_FRAGMENT_SHADER
         ? "the fragment shader" : "a shader";
-    std::string message = gProgram + ": error: " + which + " does not compile (the effect ended with status " +
-        std::to_string(status) + ")\n";
+    std::string message = headline(std::string(which) + " does not compile", status);
     const std::vector<std::string> sourceLines = lines(source ? source : "");
     for (const std::string& line : lines(log)) {
         message += indented(line);
@@ -127,31 +129,29 @@ std::string FatalExit::explainShader(const std::string& log, int status) {
 
 // The name, the folder searched, and why nothing was found there.
 std::string FatalExit::explainFile(const std::string& name, bool isAsset, int status) {
-    std::string message = gProgram + ": error: the effect ";
-    const std::string ended = " (the effect ended with status " + std::to_string(status) + ")\n  ";
     if (!isAsset) {
         char directory[4096];
         const bool relative = name.empty() || name[0] != '/';
-        message += "could not open a file" + ended + name;
+        std::string message = headline("the effect could not open a file", status) + "  " + name;
         if (relative && getcwd(directory, sizeof(directory))) message += std::string(", searched in ") + directory;
         return message + "\n";
     }
     if (gAssetDirectory.empty()) {
-        return message + "asked for an asset, and it has no asset folder" + ended + name +
+        return headline("the effect asked for an asset, and it has no asset folder", status) + "  " + name +
             ": give the folder with --assets DIR, or put assets/ beside the plug-in\n";
     }
     std::string path;
     switch (vi::DirectoryAssetManager::find(gAssetDirectory, name.c_str(), path)) {
         case vi::DirectoryAssetManager::Lookup::Outside:
-            return message + "asked for an asset outside its asset folder" + ended + name + " leads out of " +
-                gAssetDirectory + "; an asset is named relative to that folder, and never leaves it\n";
+            return headline("the effect asked for an asset outside its asset folder", status) + "  " + name +
+                " leads out of " + gAssetDirectory + "; an asset is named relative to that folder, and never leaves it\n";
         case vi::DirectoryAssetManager::Lookup::NotAFile:
-            return message + "asked for an asset that is not a file" + ended + name + " is a folder or a device in " +
-                gAssetDirectory + "\n";
+            return headline("the effect asked for an asset that is not a file", status) + "  " + name +
+                " is a folder or a device in " + gAssetDirectory + "\n";
         case vi::DirectoryAssetManager::Lookup::Missing:
         case vi::DirectoryAssetManager::Lookup::Found:
             break;
     }
-    return message + "asked for an asset that does not exist" + ended + name + ", searched in " + gAssetDirectory +
-        "\n";
+    return headline("the effect asked for an asset that does not exist", status) + "  " + name + ", searched in " +
+        gAssetDirectory + "\n";
 }

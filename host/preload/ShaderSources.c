@@ -28,6 +28,11 @@ static void* driver(const char* name) {
     return dlsym(RTLD_NEXT, name);
 }
 
+/* A part's length as the driver reads it: a negative or absent length means up to the NUL. */
+static size_t partLength(const GLchar* const* strings, const GLint* lengths, GLsizei i) {
+    return lengths && lengths[i] >= 0 ? (size_t)lengths[i] : strlen(strings[i]);
+}
+
 VI_PRELOADED GLuint glCreateShader(GLenum type) {
     static GLuint (*real)(GLenum);
     if (!real) real = (GLuint (*)(GLenum))driver("glCreateShader");
@@ -39,14 +44,14 @@ VI_PRELOADED GLuint glCreateShader(GLenum type) {
 VI_PRELOADED void glShaderSource(GLuint shader, GLsizei count, const GLchar* const* strings, const GLint* lengths) {
     static void (*real)(GLuint, GLsizei, const GLchar* const*, const GLint*);
     if (!real) real = (void (*)(GLuint, GLsizei, const GLchar* const*, const GLint*))driver("glShaderSource");
-    /* The parts joined as the driver joins them; a negative or absent length means up to the NUL. */
+    /* The parts joined as the driver joins them. */
     size_t total = 0;
-    for (GLsizei i = 0; i < count; ++i) total += lengths && lengths[i] >= 0 ? (size_t)lengths[i] : strlen(strings[i]);
+    for (GLsizei i = 0; i < count; ++i) total += partLength(strings, lengths, i);
     char* source = malloc(total + 1);
     if (source) {
         size_t at = 0;
         for (GLsizei i = 0; i < count; ++i) {
-            size_t length = lengths && lengths[i] >= 0 ? (size_t)lengths[i] : strlen(strings[i]);
+            size_t length = partLength(strings, lengths, i);
             memcpy(source + at, strings[i], length);
             at += length;
         }
