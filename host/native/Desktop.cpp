@@ -2,7 +2,8 @@
 // desktop does not. A headless EGL surface kept current on the calling thread
 // (the player's render thread), the current surface's pixels, any key code,
 // the plug-in's asset directory, the window rectangle, why a plug-in does not
-// load, the preloaded clock, and the message when the effect ends the process.
+// load, the preloaded clock, and the message when the effect ends the process
+// or crashes.
 // The live window uses all but the surface.
 #include <EGL/egl.h>
 #include <EGL/eglext.h>
@@ -15,6 +16,7 @@
 #include <vector>
 
 #include "Application/Application.h"
+#include "CrashReport.h"
 #include "FatalExit.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/File.h"
@@ -145,7 +147,14 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(setAssetDirectory)(JNIEnv* env, jclass, js
 JNIEXPORT void JNICALL DESKTOP_NATIVE(explainFatalExits)(JNIEnv* env, jclass, jstring program) {
     const char* chars = env->GetStringUTFChars(program, nullptr);
     FatalExit::watch(chars);
+    CrashReport::watch(chars);
     env->ReleaseStringUTFChars(program, chars);
+}
+
+JNIEXPORT void JNICALL DESKTOP_NATIVE(watchEffect)(JNIEnv* env, jclass, jstring path) {
+    const char* chars = env->GetStringUTFChars(path, nullptr);
+    CrashReport::watchEffect(chars);
+    env->ReleaseStringUTFChars(path, chars);
 }
 
 JNIEXPORT void JNICALL DESKTOP_NATIVE(removeOnFatalExit)(JNIEnv* env, jclass, jstring path) {

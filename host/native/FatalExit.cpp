@@ -78,6 +78,8 @@ void FatalExit::setAssetDirectory(const std::string& directory) { gAssetDirector
 
 void FatalExit::removeOnFatalExit(const std::string& path) { gRemoveOnExit.push_back(path); }
 
+const std::vector<std::string>& FatalExit::pathsToRemove() { return gRemoveOnExit; }
+
 // Runs on the thread that called exit(): for a report, the GL thread, still
 // inside the failing function, whose frame (and the report in it) exit() never leaves.
 void FatalExit::onExit() {

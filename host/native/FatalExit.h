@@ -8,6 +8,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 class FatalExit {
 public:
@@ -17,6 +18,8 @@ public:
     static void setAssetDirectory(const std::string& directory);
     // A file or folder to remove if the effect ends the process.
     static void removeOnFatalExit(const std::string& path);
+    // Those files and folders, for the crash handler.
+    static const std::vector<std::string>& pathsToRemove();
 
 private:
     static void onExit();

@@ -1,9 +1,12 @@
 // An effect that makes one author's mistake as it starts, chosen at build
 // time: MISTAKE_SHADER (a fragment shader that does not compile),
 // MISTAKE_LINK (a varying the vertex shader never writes), MISTAKE_ASSET or
-// MISTAKE_FILE (the name of an asset or a file to read). Without one it draws
-// a colour, for as long as the host lets it.
+// MISTAKE_FILE (the name of an asset or a file to read); or as it draws its
+// first frame: MISTAKE_NULL_WRITE (a write through a null member) or
+// MISTAKE_ABORT. Without one it draws a colour, for as long as the host lets it.
 #include <GLES2/gl2.h>
+
+#include <cstdlib>
 
 #include "Application/Scene.h"
 #include "Render/ShaderProgram.h"
@@ -32,10 +35,18 @@ public:
     }
 
     int draw() override {
+#if defined(MISTAKE_NULL_WRITE)
+        mCounts[0] = 1;  // the null write
+#elif defined(MISTAKE_ABORT)
+        std::abort();  // the abort
+#endif
         glClearColor(0.2f, 0.3f, 0.4f, 1.0f);
         glClear(GL_COLOR_BUFFER_BIT);
         return 0;
     }
+
+private:
+    int* mCounts = nullptr;
 };
 
 }  // namespace

@@ -30,8 +30,16 @@ final class Desktop {
      * From now on, when the effect ends the process through the runtime's
      * fatal report (exit 88, 67, 71 or 45), an exit handler that never calls
      * back into Java tells it on standard error, as "PROGRAM: error: ...".
+     * So does a crash (SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGABRT), when the
+     * JDK's signal chaining library is preloaded: the status is then 128 + the signal's number.
      */
     static native void explainFatalExits(String program);
+
+    /**
+     * The plug-in the runtime is about to open: when the process crashes in
+     * it, the message names the effect's function and source line (see explainFatalExits).
+     */
+    static native void watchEffect(String path);
 
     /** A file or folder the exit handler removes if the effect ends the process. */
     static native void removeOnFatalExit(String path);

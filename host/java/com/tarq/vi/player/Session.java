@@ -112,6 +112,7 @@ final class Session {
      * initialisation. Returns false when the runtime refuses the library.
      */
     boolean start(String library, boolean quiet) {
+        Desktop.watchEffect(library);
         String[] names = host.prehandleStart(library, width, height);
         if (names == null) return false;
         for (String name : names) {

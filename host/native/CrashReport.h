@@ -1,0 +1,32 @@
+// Tells the author where the effect crashed: on SIGSEGV, SIGBUS, SIGFPE,
+// SIGILL or SIGABRT, one short message naming the signal and the effect's
+// function with its source file and line, then the host's half-written files
+// go and the process ends with 128 + the signal's number, leaving no core.
+//
+// The JVM takes SIGSEGV and the others for itself (safepoints, null checks in
+// compiled code), so the handler only ever runs second: the launchers preload
+// the JDK's signal chaining library, the JVM's handlers stay in place, and the
+// JVM calls this one only for a fault it does not own. Without that library
+// nothing is installed and the JVM reports crashes in its own way.
+//
+// The handler cannot trust the heap (the effect may have broken it), so it
+// allocates nothing: it works in fixed buffers, and the two things it cannot
+// do without memory (reading debug information, removing folders) are done
+// by programs it starts, addr2line and rm.
+#pragma once
+
+#include <csignal>
+#include <string>
+
+class CrashReport {
+public:
+    // Installs the handler once; `program` starts each message ("vi-player").
+    static void watch(const std::string& program);
+    // The plug-in the runtime is about to open: its frames are the effect's.
+    // The file is held open, so that its debug information can be read even
+    // after the file itself has gone (the live window runs from copies).
+    static void watchEffect(const std::string& path);
+
+private:
+    static void onSignal(int signal, siginfo_t* info, void* context);
+};
