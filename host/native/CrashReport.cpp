@@ -29,9 +29,12 @@ constexpr int kMostFrames = 64;
 constexpr int kEffects = 2;
 // How long addr2line or rm may take before the process ends without them.
 constexpr int kHelperMilliseconds = 10000;
-// Pairs of lines (function, file:line) read from addr2line: the fault's
-// function and the functions inlined into it.
-constexpr int kMostLines = 32;
+// The effect's frames named, from the fault out, to find the first in the
+// author's own sources.
+constexpr int kMostNamed = 16;
+// The lines read from addr2line: for each frame, its address and a pair of
+// lines for it and each function inlined into it.
+constexpr int kMostLines = 512;
 // A symbol the JDK's signal chaining library defines: only with it loaded may
 // a handler for the JVM's signals be installed.
 const char kChainingSymbol[] = "JVM_begin_signal_setting";
@@ -42,8 +45,9 @@ struct Effect {
 };
 
 // A message or a program's output, built without the heap.
+template <std::size_t Capacity>
 struct Text {
-    char data[8192] = {};
+    char data[Capacity] = {};
     std::size_t size = 0;
 
     Text& operator<<(const char* text) {
@@ -75,11 +79,11 @@ char gProgram[64];
 Effect gEffects[kEffects];
 std::atomic<pid_t> gReporter{0};
 void* gFrames[kMostFrames];
-Text gMessage;
-Text gDetail;
-Text gOutput;
-Text gOffset;
-Text gEffectFile;
+Text<4096> gMessage;
+Text<4096> gDetail;
+Text<32768> gOutput;
+Text<24> gOffsets[kMostNamed + 1];
+Text<32> gEffectFile;
 const char* gArguments[128];
 
 // The instruction that faulted, from the signal's context: the one place that knows the CPU.
@@ -117,7 +121,7 @@ const Effect* effectAt(const char* path) {
 // when given and its standard error discarded, for at most
 // kHelperMilliseconds; `keep`, if open, stays open in it. Returns its exit
 // status, or -1. Forked without the fork handlers, which may need the heap.
-int run(const char* const arguments[], int keep, Text* output) {
+int run(const char* const arguments[], int keep, Text<32768>* output) {
     int pipe[2];
     if (pipe2(pipe, O_CLOEXEC) != 0) return -1;
     const pid_t child = _Fork();
@@ -159,34 +163,56 @@ int run(const char* const arguments[], int keep, Text* output) {
     return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
+bool isUnknown(const char* place) { return std::strncmp(place, "??", 2) == 0; }
+
 bool isSystemHeader(const char* place) {
     return std::strncmp(place, "/usr/include/", 13) == 0 || std::strncmp(place, "/usr/lib/", 9) == 0;
 }
 
-// addr2line's answer for one address, as pairs of lines (function,
-// file:line) from the innermost inlined function out: the first pair in the
-// author's own sources, else the outermost (the function itself).
-bool describePlace(char* answer) {
-    char* lines[kMostLines];
+// Splits a text into its lines, in place.
+int splitLines(char* text, char* lines[], int most) {
     int count = 0;
-    for (char* line = answer; *line && count < kMostLines;) {
+    for (char* line = text; *line && count < most;) {
         lines[count++] = line;
         char* end = std::strchr(line, '\n');
         if (!end) break;
         *end = '\0';
         line = end + 1;
     }
-    if (count < 2 || std::strncmp(lines[1], "??", 2) == 0) return false;
-    int chosen = (count / 2 - 1) * 2;
-    for (int pair = 0; pair + 1 < count; pair += 2) {
-        if (!isSystemHeader(lines[pair + 1])) {
-            chosen = pair;
-            break;
+    return count;
+}
+
+// addr2line's answer names, for each address (a line "0x..."), the frame's
+// function, then file:line pairs from the innermost inlined function out,
+// each after the name of the function it is in. The place told is the first
+// in the author's own sources, not a system header's, with its frame's
+// function; the fault's own place when there is none. False when the
+// library has no debug information.
+bool describePlace(char* answer) {
+    char* lines[kMostLines];
+    const int count = splitLines(answer, lines, kMostLines);
+    char* function = nullptr;
+    char* place = nullptr;
+    int frame = -1;
+    for (int line = 0; line < count; ++line) {
+        if (std::strncmp(lines[line], "0x", 2) == 0) {
+            frame = line + 1;
+        } else if (frame >= 0 && (line - frame) % 2 == 1 && !isUnknown(lines[line])) {
+            const bool own = !isSystemHeader(lines[line]);
+            if (!place || own) {
+                function = lines[frame];
+                place = lines[line];
+            }
+            if (own) break;
         }
     }
-    char* discriminator = std::strstr(lines[chosen + 1], " (discriminator");
+    if (!place) return false;
+    // The compiler's notes on how it built the code mean nothing to the author.
+    char* discriminator = std::strstr(place, " (discriminator");
     if (discriminator) *discriminator = '\0';
-    gDetail << "  in " << lines[chosen] << " at " << lines[chosen + 1];
+    char* clone = std::strstr(function, " [clone ");
+    if (clone) *clone = '\0';
+    gDetail << "  in " << function << " at " << place;
     return true;
 }
 
@@ -195,34 +221,28 @@ const char* baseName(const char* path) {
     return slash ? slash + 1 : path;
 }
 
-// The function and file:line of `address` in the library `info` names, from
-// the library's debug information; its name and the offset when it has none.
-void describe(uintptr_t address, const Dl_info& info, const link_map* library, const Effect* effect) {
-    gOutput.clear();
-    gOffset.clear();
-    gOffset.number(address - library->l_addr, 16);
-    const char* file = info.dli_fname;
-    if (effect) {
-        gEffectFile.clear();
-        gEffectFile << "/proc/self/fd/";
-        gEffectFile.number(unsigned(effect->file), 10);
-        file = gEffectFile.data;
-    }
-    const char* const arguments[] = {"addr2line", "-f", "-C", "-i", "-e", file, gOffset.data, nullptr};
-    const int status = run(arguments, effect ? effect->file : -1, &gOutput);
+// Names the first `count` of gOffsets in the library `file`, from its debug
+// information; `keep` is the library's open file, if the name is a
+// descriptor's. Its name and the fault's offset when it has no debug information.
+void describe(const char* file, int count, int keep, const char* library, bool inEffect) {
+    std::size_t argument = 0;
+    for (const char* word : {"addr2line", "-a", "-f", "-C", "-i", "-e", file}) gArguments[argument++] = word;
+    for (int offset = 0; offset < count; ++offset) gArguments[argument++] = gOffsets[offset].data;
+    gArguments[argument] = nullptr;
+    const int status = run(gArguments, keep, &gOutput);
     if (status == 0 && describePlace(gOutput.data)) {
-        if (!effect) gDetail << " (" << baseName(info.dli_fname) << ")";
+        if (!inEffect) gDetail << " (" << library << ")";
         gDetail << "\n";
         return;
     }
-    gDetail << "  in " << baseName(info.dli_fname) << " at offset " << gOffset.data
-             << (status == 127 ? "; addr2line (binutils) is not installed to name the function and line\n"
-                               : ", which has no debug information: build it with -g to see the function and line\n");
+    gDetail << "  in " << library << " at offset " << gOffsets[0].data
+            << (status == 127 ? "; addr2line (binutils) is not installed to name the function and line\n"
+                              : ", which has no debug information: build it with -g to see the function and line\n");
 }
 
 // From the faulting frame out (found on the stack by its address), the
-// first frame in the effect; the innermost one in any library when none is.
-// Returns whether the effect's was found.
+// frames in the effect; the innermost one in any library when none is.
+// Returns whether the effect's were found.
 bool describeStack(uintptr_t faulting) {
     int count = backtrace(gFrames, kMostFrames);
     int first = 0;
@@ -233,10 +253,10 @@ bool describeStack(uintptr_t faulting) {
         first = 0;
         count = 1;
     }
-    Dl_info outside = {};
-    link_map* outsideLibrary = nullptr;
-    uintptr_t outsideAddress = 0;
-    for (int frame = first; frame < count; ++frame) {
+    const Effect* effect = nullptr;
+    int named = 0;
+    const char* outside = nullptr;
+    for (int frame = first; frame < count && named < kMostNamed; ++frame) {
         // A caller's frame holds the address after its call: one back is the call.
         const uintptr_t address = uintptr_t(gFrames[frame]) - (frame == first ? 0 : 1);
         Dl_info info;
@@ -245,18 +265,26 @@ bool describeStack(uintptr_t faulting) {
             !info.dli_fname || !library) {
             continue;
         }
-        if (const Effect* effect = effectAt(info.dli_fname)) {
-            describe(address, info, library, effect);
-            return true;
-        }
-        if (!outsideLibrary) {
-            outside = info;
-            outsideLibrary = library;
-            outsideAddress = address;
+        const Effect* in = effectAt(info.dli_fname);
+        if (in && (!effect || in == effect)) {
+            effect = in;
+            gOffsets[named].clear();
+            gOffsets[named++].number(address - library->l_addr, 16);
+        } else if (!in && !effect && !outside) {
+            outside = info.dli_fname;
+            gOffsets[kMostNamed].clear();
+            gOffsets[kMostNamed].number(address - library->l_addr, 16);
         }
     }
-    if (outsideLibrary) describe(outsideAddress, outside, outsideLibrary, nullptr);
-    return false;
+    if (effect) {
+        gEffectFile << "/proc/self/fd/";
+        gEffectFile.number(unsigned(effect->file), 10);
+        describe(gEffectFile.data, named, effect->file, baseName(effect->path), true);
+    } else if (outside) {
+        gOffsets[0] = gOffsets[kMostNamed];
+        describe(outside, 1, -1, baseName(outside), false);
+    }
+    return effect != nullptr;
 }
 
 // Removes what the host was half-way through writing, deepest first, links not followed.
@@ -313,7 +341,8 @@ void CrashReport::onSignal(int signal, siginfo_t* info, void* context) {
     const bool inEffect = describeStack(faultingInstruction(context));
     gMessage << gProgram << ": error: " << (inEffect ? "the effect crashed: SIG" : "a crash outside the effect: SIG")
              << sigabbrev_np(signal) << " (" << explanation(signal);
-    if (signal == SIGSEGV || signal == SIGBUS) {
+    // The address is the fault's only when the kernel sent the signal, not another process.
+    if ((signal == SIGSEGV || signal == SIGBUS) && info->si_code > 0) {
         gMessage << ", at ";
         gMessage.number(uintptr_t(info->si_addr), 16);
     }

@@ -2,9 +2,12 @@
 # The player's failures as a user meets them: for each kind of bad input, and
 # each mistake that ends the effect, its status, the message's key words
 # ('^' between them), and no output folder (nor a partial one) left behind.
-# usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR MISTAKE_PLUGINS_DIR
+# A crash in the effect is its signal's status, its name, the effect's function and file:line,
+# and neither a JVM banner nor a crash file.
+# usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR MISTAKE_PLUGINS_DIR MISTAKE_SOURCE
 set -uo pipefail
-player="$1" plugin="$2" nofactory="$3" m="$5"
+player="$1" plugin="$2" nofactory="$3" m="$5" source="$6"
+at() { echo "Mistake::draw() at $source:$(grep -n "// the $1" "$source" | cut -d: -f1)"; }
 rm -rf "$4" && mkdir -p "$4/assets" && cd "$4" || exit 1
 echo "not a picture" | tee broken.png > libgarbage.so
 echo "beside the asset folder" > secret
@@ -14,10 +17,13 @@ fail() { echo "FAIL ($args): $*"; cat stderr.txt; failures=$((failures + 1)); }
 while IFS=';' read -r status message args; do
   actual=0
   # shellcheck disable=SC2086  # the arguments are words
-  "$player" --quiet --out result $args > /dev/null 2> stderr.txt || actual=$?
+  "$player" --quiet --out result $args > stdout.txt 2> stderr.txt || actual=$?
   [ "$actual" -eq "$status" ] || fail "status $actual, expected $status"
   while read -r -d '^' part; do grep -qF -- "$part" stderr.txt || fail "no \"$part\""; done <<< "$message^"
-  if [ -e result ] || compgen -G '.result.*' > /dev/null; then fail "output left behind"; fi
+  ! grep -q "fatal error" stdout.txt stderr.txt || fail "the JVM's banner"
+  if [ -e result ] || compgen -G '.result.*' > /dev/null || compgen -G 'hs_err*' > /dev/null; then
+    fail "output left behind"
+  fi
   rm -rf result .result.*
 done < <(cat <<ROWS
 1;plug-in not found: missing/libnone.so;missing/libnone.so
@@ -36,6 +42,8 @@ done < <(cat <<ROWS
 71;asset that does not exist (the effect ended with status 71)^ghost.bin, searched in $(pwd -P)/assets;--assets assets $m/libvi_mistake_ghost.so
 71;asset outside its asset folder (the effect ended with status 71)^../secret leads out of $(pwd -P)/assets;--assets assets $m/libvi_mistake_secret.so
 45;could not open a file (the effect ended with status 45)^nowhere.txt, searched in $(pwd -P);$m/libvi_mistake_file.so
+139;error: the effect crashed: SIGSEGV (a read or write through a bad pointer, at 0x0)^$(at "null write");$m/libvi_mistake_nullwrite.so
+134;error: the effect crashed: SIGABRT (abort() was called^$(at abort);$m/libvi_mistake_abort.so
 ROWS
 # Each kind of bad timeline line, after a comment and a good event: the file, the line and the problem.
 while IFS='|' read -r line message; do
