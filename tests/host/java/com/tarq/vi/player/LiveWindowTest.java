@@ -19,6 +19,7 @@ import org.junit.jupiter.api.Test;
  * input through XTest (xdotool) and read back through its own screenshot key,
  * in one session as an author keeps it open: the test effect paints white
  * where the finger goes over its colour, and is rebuilt while the window runs.
+ * Before it, the ways the window ends at once: no display, a bad option, a crash.
  */
 class LiveWindowTest {
     private static final int BLUE = 0x2050E0, ORANGE = 0xF08020, WHITE = 0xFFFFFF;
@@ -38,6 +39,10 @@ class LiveWindowTest {
         assertTrue(noDisplay.contains("run it under xvfb-run") && noDisplay.endsWith("status 1"), noDisplay);
         String badOption = run(viLive, "--fps", "30", plugin.toString());
         assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
+        // A crash in the effect, run from a copy that is gone: the signal's status and the effect's own line.
+        String crash = run(viLive, System.getProperty("vi.nullwrite"));
+        assertTrue(crash.contains("vi-live: error: the effect crashed: SIGSEGV") && crash.contains("::draw() at ")
+            && crash.contains("Mistake.cpp:") && crash.endsWith("status 139"), crash);
 
         live = new ProcessBuilder(viLive, "--size", "180x320", plugin.toString())
             .directory(scratch.toFile()).redirectOutput(log.toFile()).redirectErrorStream(true).start();
