@@ -27,7 +27,8 @@ constexpr int kMostFrames = 64;
 // The plug-ins whose frames are the effect's: the one running and the one
 // before, which the live window starts again when a new build does not load.
 constexpr int kEffects = 2;
-// How long addr2line or rm may take before the process ends without them.
+// How long addr2line or rm may take before the process ends without them,
+// and how long the handler waits for a write under way.
 constexpr int kHelperMilliseconds = 10000;
 // The effect's frames named, from the fault out, to find the first in the
 // author's own sources.
@@ -78,6 +79,8 @@ struct Text {
 char gProgram[64];
 Effect gEffects[kEffects];
 std::atomic<pid_t> gReporter{0};
+// The thread writing into the files the handler removes, while it writes.
+std::atomic<pid_t> gWriter{0};
 void* gFrames[kMostFrames];
 Text<4096> gMessage;
 Text<4096> gDetail;
@@ -117,6 +120,12 @@ const Effect* effectAt(const char* path) {
     return nullptr;
 }
 
+int64_t monotonicMilliseconds() {
+    timespec now;
+    clock_gettime(CLOCK_MONOTONIC, &now);
+    return now.tv_sec * 1000 + now.tv_nsec / 1000000;
+}
+
 // Runs a program, found on the PATH, with its standard output into `output`
 // when given and its standard error discarded, for at most
 // kHelperMilliseconds; `keep`, if open, stays open in it. Returns its exit
@@ -138,13 +147,10 @@ int run(const char* const arguments[], int keep, Text<32768>* output) {
         close(pipe[0]);
         return -1;
     }
-    timespec now;
-    clock_gettime(CLOCK_MONOTONIC, &now);
-    const int64_t deadline = now.tv_sec * 1000 + now.tv_nsec / 1000000 + kHelperMilliseconds;
+    const int64_t deadline = monotonicMilliseconds() + kHelperMilliseconds;
     bool ended = false;
     while (!ended) {
-        clock_gettime(CLOCK_MONOTONIC, &now);
-        const int64_t left = deadline - (now.tv_sec * 1000 + now.tv_nsec / 1000000);
+        const int64_t left = deadline - monotonicMilliseconds();
         pollfd readable = {pipe[0], POLLIN, 0};
         if (left <= 0 || poll(&readable, 1, int(left)) == 0) break;
         char chunk[512];
@@ -287,8 +293,12 @@ bool describeStack(uintptr_t faulting) {
     return effect != nullptr;
 }
 
-// Removes what the host was half-way through writing, deepest first, links not followed.
-void removeHalfWritten() {
+// Removes what the host was half-way through writing, once a write under way
+// on another thread has ended; no write begins after the reporter is chosen.
+void removeHalfWritten(pid_t self) {
+    const int64_t deadline = monotonicMilliseconds() + kHelperMilliseconds;
+    const timespec millisecond = {0, 1000000};
+    while (gWriter != 0 && gWriter != self && monotonicMilliseconds() < deadline) nanosleep(&millisecond, nullptr);
     const std::vector<std::string>& paths = FatalExit::pathsToRemove();
     if (paths.empty()) return;
     std::size_t count = 0;
@@ -329,6 +339,16 @@ void CrashReport::watchEffect(const std::string& path) {
     gEffects[0].file = open(path.c_str(), O_RDONLY | O_CLOEXEC);
 }
 
+void CrashReport::beginWrite() {
+    gWriter = pid_t(syscall(SYS_gettid));
+    if (gReporter != 0) {
+        gWriter = 0;
+        for (;;) pause();
+    }
+}
+
+void CrashReport::endWrite() { gWriter = 0; }
+
 void CrashReport::onSignal(int signal, siginfo_t* info, void* context) {
     const pid_t self = pid_t(syscall(SYS_gettid));
     pid_t reporter = 0;
@@ -338,21 +358,26 @@ void CrashReport::onSignal(int signal, siginfo_t* info, void* context) {
         if (reporter == self) _exit(128 + signal);
         for (;;) pause();
     }
-    const bool inEffect = describeStack(faultingInstruction(context));
-    gMessage << gProgram << ": error: " << (inEffect ? "the effect crashed: SIG" : "a crash outside the effect: SIG")
-             << sigabbrev_np(signal) << " (" << explanation(signal);
-    // The address is the fault's only when the kernel sent the signal, not another process.
-    if ((signal == SIGSEGV || signal == SIGBUS) && info->si_code > 0) {
-        gMessage << ", at ";
-        gMessage.number(uintptr_t(info->si_addr), 16);
+    if (info->si_code == SI_USER && info->si_pid != getpid()) {
+        // Sent by another process (kill -SEGV): no fault, and no place to name.
+        gMessage << gProgram << ": error: ended by SIG" << sigabbrev_np(signal) << " from process ";
+        gMessage.number(unsigned(info->si_pid), 10) << "\n";
+    } else {
+        const bool inEffect = describeStack(faultingInstruction(context));
+        gMessage << gProgram << ": error: " << (inEffect ? "the effect crashed: SIG" : "a crash outside the effect: SIG")
+                 << sigabbrev_np(signal) << " (" << explanation(signal);
+        if ((signal == SIGSEGV || signal == SIGBUS) && info->si_code > 0) {
+            gMessage << ", at ";
+            gMessage.number(uintptr_t(info->si_addr), 16);
+        }
+        gMessage << ")\n" << gDetail.data;
     }
-    gMessage << ")\n" << gDetail.data;
     ssize_t written = 0;
     while (written < ssize_t(gMessage.size)) {
         const ssize_t count = write(STDERR_FILENO, gMessage.data + written, gMessage.size - std::size_t(written));
         if (count <= 0 && errno != EINTR) break;
         if (count > 0) written += count;
     }
-    removeHalfWritten();
+    removeHalfWritten(self);
     _exit(128 + signal);
 }

@@ -26,6 +26,11 @@ public:
     // The file is held open, so that its debug information can be read even
     // after the file itself has gone (the live window runs from copies).
     static void watchEffect(const std::string& path);
+    // Around each write into the files the handler removes (one writing
+    // thread): the handler waits for a write under way, and a write that
+    // would begin after the handler has started waits for the process to end.
+    static void beginWrite();
+    static void endWrite();
 
 private:
     static void onSignal(int signal, siginfo_t* info, void* context);

@@ -157,6 +157,10 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(watchEffect)(JNIEnv* env, jclass, jstring 
     env->ReleaseStringUTFChars(path, chars);
 }
 
+JNIEXPORT void JNICALL DESKTOP_NATIVE(beginWrite)(JNIEnv*, jclass) { CrashReport::beginWrite(); }
+
+JNIEXPORT void JNICALL DESKTOP_NATIVE(endWrite)(JNIEnv*, jclass) { CrashReport::endWrite(); }
+
 JNIEXPORT void JNICALL DESKTOP_NATIVE(removeOnFatalExit)(JNIEnv* env, jclass, jstring path) {
     const char* chars = env->GetStringUTFChars(path, nullptr);
     FatalExit::removeOnFatalExit(chars);

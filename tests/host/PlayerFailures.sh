@@ -62,8 +62,9 @@ NaN unlock|3: "NaN" is not a time in seconds
 LINES
 )
 
-# Ctrl-C or SIGTERM once the output folder is being written: the signal's status, nothing left behind.
-for signal in INT TERM; do
+# Ctrl-C, SIGTERM, or a crash's signal from outside once the output folder is being written: the
+# signal's status, nothing left behind, and the sender of a crash's signal named.
+for signal in INT TERM SEGV ABRT; do
   args="SIG$signal"
   env --default-signal=INT "$player" --quiet --out result --duration 60 "$m/libvi_mistake_none.so" 2> stderr.txt &
   for _ in $(seq 300); do compgen -G '.result.partial-*' > /dev/null && break; sleep 0.1; done
@@ -71,6 +72,8 @@ for signal in INT TERM; do
   kill -s "$signal" $! && wait $!
   actual=$?
   [ "$actual" -eq $((128 + $(kill -l "$signal"))) ] || fail "status $actual"
+  [[ $signal == INT || $signal == TERM ]] || grep -qF "error: ended by SIG$signal from process $$" stderr.txt ||
+    fail "no sender named"
   if [ -e result ] || compgen -G '.result.*' > /dev/null; then fail "output left behind"; fi
 done
 

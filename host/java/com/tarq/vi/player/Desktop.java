@@ -41,6 +41,15 @@ final class Desktop {
      */
     static native void watchEffect(String path);
 
+    /**
+     * Around each write into a path removeOnFatalExit named: the crash
+     * handler waits for a write under way before it removes the path, and a
+     * write that would begin after that waits for the process to end.
+     */
+    static native void beginWrite();
+
+    static native void endWrite();
+
     /** A file or folder the exit handler removes if the effect ends the process. */
     static native void removeOnFatalExit(String path);
 

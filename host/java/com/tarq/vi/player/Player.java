@@ -86,25 +86,25 @@ public final class Player {
         double duration = duration(timeline);
         int frames = Math.max(1, (int) Math.round(duration * options.fps));
         Path partial = out.resolveSibling("." + out.getFileName() + ".partial-" + ProcessHandle.current().pid());
-        // The hook first, so that no signal finds the folder without it; every
-        // write into the folder, its making included, holds the hook's lock.
+        // The hook and the crash handler first, so that no signal finds the folder without them;
+        // every write into the folder, its making included, goes through write().
         Runtime.getRuntime().addShutdownHook(new Thread(() -> abandon(partial)));
+        Session.loadLibraries("vi-player");
+        Desktop.explainFatalExits("vi-player");
+        Desktop.removeOnFatalExit(partial.toString());
         try {
-            Pictures pictures;
-            synchronized (partialLock) {
-                stopIfAbandoned();
+            Pictures pictures = write(() -> {
                 Files.createDirectories(partial);
                 Files.createFile(partial.resolve(MARK));
-                pictures = new Pictures(partial, options.width, options.height, options.fps, frames,
-                    options.sheetFrames);
-            }
+                return new Pictures(partial, options.width, options.height, options.fps, frames, options.sheetFrames);
+            });
             try (pictures) {
-                play(plugin, timeline, frames, pictures, partial);
-                synchronized (partialLock) {
-                    stopIfAbandoned();
+                play(plugin, timeline, frames, pictures);
+                write(() -> {
                     pictures.finish();
                     replace(out, partial);
-                }
+                    return null;
+                });
             }
         } finally {
             synchronized (partialLock) {
@@ -118,11 +118,7 @@ public final class Player {
         System.out.println("preview:       " + out.resolve(Pictures.PREVIEW));
     }
 
-    private void play(Path plugin, Timeline timeline, int frames, Pictures pictures, Path partial)
-            throws Failure, IOException {
-        Session.loadLibraries("vi-player");
-        Desktop.explainFatalExits("vi-player");
-        Desktop.removeOnFatalExit(partial.toString());
+    private void play(Path plugin, Timeline timeline, int frames, Pictures pictures) throws Failure, IOException {
         Desktop.open(options.width, options.height);
         if (options.fixedStep && !Desktop.setClock(FIXED_CLOCK_START)) {
             throw new Failure("--fixed-step needs the player's clock library preloaded; start it with vi-player");
@@ -157,10 +153,11 @@ public final class Player {
             host.prehandleDraw();
             BufferedImage image = session.readFrame();
             frameTimes.add(System.nanoTime() - drawn);
-            synchronized (partialLock) {
-                stopIfAbandoned();
-                pictures.add(frame, seconds, image);
-            }
+            int written = frame;
+            write(() -> {
+                pictures.add(written, seconds, image);
+                return null;
+            });
             progress.frameDone(frame);
         }
         host.prehandleStop();
@@ -204,6 +201,28 @@ public final class Player {
                 deleteTree(partial);
             } catch (IOException e) {
                 System.err.println("vi-player: cannot remove " + partial + ": " + e.getMessage());
+            }
+        }
+    }
+
+    /** A write into the partial folder, and what it makes. */
+    private interface Write<T> {
+        T run() throws IOException;
+    }
+
+    /**
+     * Every write into the partial folder: under the hook's lock, and never
+     * while the crash handler removes the folder (it waits for a write under
+     * way, and a write that would begin after it waits for the process to end).
+     */
+    private <T> T write(Write<T> write) throws IOException {
+        synchronized (partialLock) {
+            stopIfAbandoned();
+            Desktop.beginWrite();
+            try {
+                return write.run();
+            } finally {
+                Desktop.endWrite();
             }
         }
     }
