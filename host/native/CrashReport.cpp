@@ -188,17 +188,26 @@ int splitLines(char* text, char* lines[], int most) {
     return count;
 }
 
+// The compiler's notes on how it built the code mean nothing to the author.
+void dropCompilerNotes(char* function, char* place) {
+    char* clone = std::strstr(function, " [clone ");
+    if (clone) *clone = '\0';
+    char* discriminator = place ? std::strstr(place, " (discriminator") : nullptr;
+    if (discriminator) *discriminator = '\0';
+}
+
 // addr2line's answer names, for each address (a line "0x..."), the frame's
 // function, then file:line pairs from the innermost inlined function out,
 // each after the name of the function it is in. The place told is the first
 // in the author's own sources, not a system header's, with its frame's
-// function; the fault's own place when there is none. False when the
-// library has no debug information.
-bool describePlace(char* answer) {
+// function; the fault's own place when there is none. Without debug
+// information there is no place, and the symbol table may still name the
+// fault's function: false, with that name in `function` when it has one.
+bool describePlace(char* answer, char*& function) {
     char* lines[kMostLines];
     const int count = splitLines(answer, lines, kMostLines);
-    char* function = nullptr;
     char* place = nullptr;
+    function = count > 1 && !isUnknown(lines[1]) ? lines[1] : nullptr;
     int frame = -1;
     for (int line = 0; line < count; ++line) {
         if (std::strncmp(lines[line], "0x", 2) == 0) {
@@ -212,12 +221,8 @@ bool describePlace(char* answer) {
             if (own) break;
         }
     }
+    if (function) dropCompilerNotes(function, place);
     if (!place) return false;
-    // The compiler's notes on how it built the code mean nothing to the author.
-    char* discriminator = std::strstr(place, " (discriminator");
-    if (discriminator) *discriminator = '\0';
-    char* clone = std::strstr(function, " [clone ");
-    if (clone) *clone = '\0';
     gDetail << "  in " << function << " at " << place;
     return true;
 }
@@ -236,14 +241,16 @@ void describe(const char* file, int count, int keep, const char* library, bool i
     for (int offset = 0; offset < count; ++offset) gArguments[argument++] = gOffsets[offset].data;
     gArguments[argument] = nullptr;
     const int status = run(gArguments, keep, &gOutput);
-    if (status == 0 && describePlace(gOutput.data)) {
+    char* function = nullptr;
+    if (status == 0 && describePlace(gOutput.data, function)) {
         if (!inEffect) gDetail << " (" << library << ")";
         gDetail << "\n";
         return;
     }
-    gDetail << "  in " << library << " at offset " << gOffsets[0].data
-            << (status == 127 ? "; addr2line (binutils) is not installed to name the function and line\n"
-                              : ", which has no debug information: build it with -g to see the function and line\n");
+    gDetail << (function ? "  in " : "") << (function ? function : "") << "  at " + (function ? 1 : 0) << library
+            << "+" << gOffsets[0].data
+            << (status == 127 ? ": addr2line (binutils) is not installed to name the function and line\n"
+                              : ": the library has no debug information; build it with -g to see the file and line\n");
 }
 
 // From the faulting frame out (found on the stack by its address), the
