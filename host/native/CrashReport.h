@@ -10,9 +10,8 @@
 // nothing is installed and the JVM reports crashes in its own way.
 //
 // The handler cannot trust the heap (the effect may have broken it), so it
-// allocates nothing: it works in fixed buffers, and the two things it cannot
-// do without memory (reading debug information, removing folders) are done
-// by programs it starts, addr2line and rm.
+// allocates nothing; what needs memory is done by programs it starts
+// (CrashPlace names the place, rm removes the host's half-written files).
 #pragma once
 
 #include <csignal>
@@ -23,8 +22,6 @@ public:
     // Installs the handler once; `program` starts each message ("vi-player").
     static void watch(const std::string& program);
     // The plug-in the runtime is about to open: its frames are the effect's.
-    // The file is held open, so that its debug information can be read even
-    // after the file itself has gone (the live window runs from copies).
     static void watchEffect(const std::string& path);
     // Around each write into the files the handler removes (one writing
     // thread): the handler waits for a write under way, and a write that
