@@ -77,11 +77,10 @@ void dropCompilerNotes(char* function, char* place) {
     if (discriminator) *discriminator = '\0';
 }
 
-// addr2line's answer names, for each address (a line "0x..."), the frame's
-// function, then file:line pairs from the innermost inlined function out,
-// each after the name of the function it is in. The place told is the first
-// in the author's own sources, with its frame's function; the fault's own
-// place when there is none. Without debug information there is no place, and
+// addr2line's answer holds, for each address (a line "0x..."), pairs of
+// lines, function then file:line in it, from the innermost function inlined
+// there out to the frame's own. The place told is the first in the author's
+// own sources, with its function; the fault's own place when there is none. Without debug information there is no place, and
 // the symbol table may still name the fault's function: false, with that
 // name in `function` when it has one.
 bool describePlace(char* answer, char*& function, CrashPlace::Detail& detail) {
@@ -96,7 +95,7 @@ bool describePlace(char* answer, char*& function, CrashPlace::Detail& detail) {
         } else if (frame >= 0 && (line - frame) % 2 == 1 && !isUnknown(lines[line])) {
             const bool own = !isSystemHeader(lines[line]);
             if (!place || own) {
-                function = lines[frame];
+                function = lines[line - 1];
                 place = lines[line];
             }
             if (own) break;

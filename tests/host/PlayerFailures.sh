@@ -7,7 +7,7 @@
 # usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR MISTAKE_PLUGINS_DIR MISTAKE_SOURCE
 set -uo pipefail
 player="$1" plugin="$2" nofactory="$3" m="$5" source="$6"
-at() { echo "Mistake::draw() at $source:$(grep -n "// the $1" "$source" | cut -d: -f1)"; }
+at() { echo "$2^ at $source:$(grep -n "// the $1" "$source" | cut -d: -f1)"; }
 rm -rf "$4" && mkdir -p "$4/assets" && cd "$4" || exit 1
 echo "not a picture" | tee broken.png > libgarbage.so
 echo "beside the asset folder" > secret
@@ -42,8 +42,9 @@ done < <(cat <<ROWS
 71;asset that does not exist (the effect ended with status 71)^ghost.bin, searched in $(pwd -P)/assets;--assets assets $m/libvi_mistake_ghost.so
 71;asset outside its asset folder (the effect ended with status 71)^../secret leads out of $(pwd -P)/assets;--assets assets $m/libvi_mistake_secret.so
 45;could not open a file (the effect ended with status 45)^nowhere.txt, searched in $(pwd -P);$m/libvi_mistake_file.so
-139;error: the effect crashed: SIGSEGV (a read or write through a bad pointer, at 0x0)^$(at "null write");$m/libvi_mistake_nullwrite.so
-134;error: the effect crashed: SIGABRT (abort() was called^$(at abort);$m/libvi_mistake_abort.so
+139;error: the effect crashed: SIGSEGV (a read or write through a bad pointer, at 0x0)^$(at "null write" draw);$m/libvi_mistake_nullwrite.so
+139;error: the effect crashed: SIGSEGV^$(at "null call" "Mistake::draw()");$m/libvi_mistake_nullcall.so
+134;error: the effect crashed: SIGABRT (abort() was called^$(at abort "Mistake::draw()");$m/libvi_mistake_abort.so
 ROWS
 # Each kind of bad timeline line, after a comment and a good event: the file, the line and the problem.
 while IFS='|' read -r line message; do

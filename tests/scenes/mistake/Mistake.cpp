@@ -2,10 +2,12 @@
 // time: MISTAKE_SHADER (a fragment shader that does not compile),
 // MISTAKE_LINK (a varying the vertex shader never writes), MISTAKE_ASSET or
 // MISTAKE_FILE (the name of an asset or a file to read); or as it draws its
-// first frame: MISTAKE_NULL_WRITE (a write through a null member) or
-// MISTAKE_ABORT. Without one it draws a colour, for as long as the host lets it.
+// first frame: MISTAKE_NULL_WRITE (a write through a null member, in a
+// function of the standard library), MISTAKE_NULL_CALL (a call through one)
+// or MISTAKE_ABORT. Without one it draws a colour, for as long as the host lets it.
 #include <GLES2/gl2.h>
 
+#include <algorithm>
 #include <cstdlib>
 
 #include "Application/Scene.h"
@@ -36,7 +38,9 @@ public:
 
     int draw() override {
 #if defined(MISTAKE_NULL_WRITE)
-        mCounts[0] = 1;  // the null write
+        std::fill_n(mCounts, 4, 1);  // the null write
+#elif defined(MISTAKE_NULL_CALL)
+        mPrepare();  // the null call
 #elif defined(MISTAKE_ABORT)
         std::abort();  // the abort
 #endif
@@ -47,6 +51,7 @@ public:
 
 private:
     int* mCounts = nullptr;
+    void (*mPrepare)() = nullptr;
 };
 
 }  // namespace
