@@ -20,6 +20,11 @@ const int kSignals[] = {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGABRT};
 // A symbol the JDK's signal chaining library defines: only with it loaded may
 // a handler for the JVM's signals be installed.
 const char kChainingSymbol[] = "JVM_begin_signal_setting";
+// How near the stack pointer a fault is the stack's end, and what that is.
+constexpr uintptr_t kOverflowReach = 64 * 1024;
+const char kOverflow[] = "a stack overflow: a recursion that does not end, or too much on the stack";
+// The render thread's own stack for the JVM's handler and this one.
+constexpr std::size_t kOwnStackBytes = 256 * 1024;
 // The files to remove that fit on rm's command line.
 constexpr std::size_t kMostRemoved = 64;
 
@@ -33,35 +38,65 @@ const char* gArguments[kMostRemoved + 4];
 
 pid_t currentThread() { return pid_t(syscall(SYS_gettid)); }
 
-// The instruction that faulted, from the signal's context. This and
-// returnAddress are the places that know the CPU.
-uintptr_t faultingInstruction(const void* context) {
+// What the signal's context says of the interrupted code: the one place that knows the CPU.
+struct Registers {
+    uintptr_t instruction = 0;
+    uintptr_t stack = 0;
+    uintptr_t link = 0;  // where the current call returns to, when it is kept in a register
+};
+
+Registers registersOf(const void* context) {
     const auto* state = static_cast<const ucontext_t*>(context);
+    Registers registers;
 #if defined(__x86_64__)
-    return uintptr_t(state->uc_mcontext.gregs[REG_RIP]);
+    registers.instruction = uintptr_t(state->uc_mcontext.gregs[REG_RIP]);
+    registers.stack = uintptr_t(state->uc_mcontext.gregs[REG_RSP]);
 #elif defined(__aarch64__)
-    return uintptr_t(state->uc_mcontext.pc);
+    registers.instruction = uintptr_t(state->uc_mcontext.pc);
+    registers.stack = uintptr_t(state->uc_mcontext.sp);
+    registers.link = uintptr_t(state->uc_mcontext.regs[30]);
 #else
     (void)state;
-    return 0;
 #endif
+    return registers;
 }
 
-// Where a call to `faulting` returns to. Read only when `faulting` is in no
-// library: then the fault was the call itself, through a bad function
-// pointer, and nothing has run since.
-uintptr_t returnAddress(uintptr_t faulting, const void* context) {
+// Where a call to the faulting instruction returns to. Read only when that
+// is in no library: then the fault was the call itself, through a bad
+// function pointer, and nothing has run since.
+uintptr_t returnAddress(const Registers& registers) {
     Dl_info info;
-    if (dladdr(reinterpret_cast<void*>(faulting), &info)) return 0;
-    const auto* state = static_cast<const ucontext_t*>(context);
-#if defined(__x86_64__)
-    return *reinterpret_cast<const uintptr_t*>(state->uc_mcontext.gregs[REG_RSP]);
-#elif defined(__aarch64__)
-    return uintptr_t(state->uc_mcontext.regs[30]);
-#else
-    (void)state;
-    return 0;
-#endif
+    if (dladdr(reinterpret_cast<void*>(registers.instruction), &info)) return 0;
+    // A call on this CPU leaves the address on the stack, where there is no link register.
+    return registers.link != 0 ? registers.link : *reinterpret_cast<const uintptr_t*>(registers.stack);
+}
+
+// A fault this close to the stack pointer is the stack's end: no frame fits any more.
+bool isStackOverflow(const siginfo_t* info, const Registers& registers) {
+    const uintptr_t address = uintptr_t(info->si_addr);
+    const uintptr_t distance = address > registers.stack ? address - registers.stack : registers.stack - address;
+    return info->si_code > 0 && distance < kOverflowReach;
+}
+
+// A stack overflow faults where no frame can be pushed, so that the kernel
+// can call a handler (the JVM's first) only on a stack of its own. The JVM
+// installs its handler without one: its flags get SA_ONSTACK through the C
+// library's own sigaction (the chaining library's would keep the change to
+// itself), and the calling thread, the host's render thread, gets the stack.
+void overflowsOnOwnStack() {
+    alignas(16) static char stack[kOwnStackBytes];
+    stack_t own = {};
+    own.ss_sp = stack;
+    own.ss_size = sizeof(stack);
+    if (sigaltstack(&own, nullptr) != 0) return;
+    using Sigaction = int (*)(int, const struct sigaction*, struct sigaction*);
+    void* library = dlopen("libc.so.6", RTLD_NOW | RTLD_NOLOAD);
+    auto sigactionOfC = reinterpret_cast<Sigaction>(library ? dlsym(library, "sigaction") : nullptr);
+    struct sigaction jvm = {};
+    if (sigactionOfC && sigactionOfC(SIGSEGV, nullptr, &jvm) == 0) {
+        jvm.sa_flags |= SA_ONSTACK;
+        sigactionOfC(SIGSEGV, &jvm, nullptr);
+    }
 }
 
 const char* explanation(int signal) {
@@ -83,12 +118,13 @@ void compose(int signal, const siginfo_t* info, const void* context) {
         gMessage.number(unsigned(info->si_pid), 10) << "\n";
         return;
     }
-    const uintptr_t faulting = faultingInstruction(context);
-    const bool inEffect = CrashPlace::describe(faulting, returnAddress(faulting, context), gDetail);
+    const Registers registers = registersOf(context);
+    const bool inEffect = CrashPlace::describe(registers.instruction, returnAddress(registers), gDetail);
+    const bool overflow = signal == SIGSEGV && isStackOverflow(info, registers);
     gMessage << (inEffect ? "the effect crashed: SIG" : "a crash outside the effect: SIG") << sigabbrev_np(signal)
-             << " (" << explanation(signal);
+             << " (" << (overflow ? kOverflow : explanation(signal));
     // The address is the fault's only when the kernel sent the signal.
-    if ((signal == SIGSEGV || signal == SIGBUS) && info->si_code > 0) {
+    if ((signal == SIGSEGV || signal == SIGBUS) && info->si_code > 0 && !overflow) {
         gMessage << ", at ";
         gMessage.number(uintptr_t(info->si_addr), 16);
     }
@@ -131,6 +167,7 @@ void CrashReport::watch(const std::string& program) {
     static bool installed = false;
     if (installed || !dlsym(RTLD_DEFAULT, kChainingSymbol)) return;
     CrashPlace::prepare();
+    overflowsOnOwnStack();
     struct sigaction action = {};
     action.sa_sigaction = onSignal;
     // Not deferred, so that a fault in the handler itself finds it again and ends the process.

@@ -3,8 +3,8 @@
 // MISTAKE_LINK (a varying the vertex shader never writes), MISTAKE_ASSET or
 // MISTAKE_FILE (the name of an asset or a file to read); or as it draws its
 // first frame: MISTAKE_NULL_WRITE (a write through a null member, in a
-// function of the standard library), MISTAKE_NULL_CALL (a call through one)
-// or MISTAKE_ABORT. Without one it draws a colour, for as long as the host lets it.
+// function of the standard library), MISTAKE_NULL_CALL (a call through one),
+// MISTAKE_RECURSION (one that does not end) or MISTAKE_ABORT. Without one it draws a colour, for as long as the host lets it.
 #include <GLES2/gl2.h>
 
 #include <algorithm>
@@ -24,6 +24,13 @@ const char* const kFragment =
     "precision mediump float;\nvarying vec2 vGlow;\nvoid main() {\n    gl_FragColor = vec4(vGlow, 0.4, 1.0);\n}\n";
 #endif
 
+#if defined(MISTAKE_RECURSION)
+int deeper(int depth) {
+    volatile char frame[256] = {char(depth)};
+    return depth < 0 ? 0 : deeper(depth + 1) + frame[0];
+}
+#endif
+
 class Mistake : public vi::Scene {
 public:
     explicit Mistake(const int* size) : vi::Scene(size) {
@@ -41,6 +48,8 @@ public:
         std::fill_n(mCounts, 4, 1);  // the null write
 #elif defined(MISTAKE_NULL_CALL)
         mPrepare();  // the null call
+#elif defined(MISTAKE_RECURSION)
+        deeper(0);
 #elif defined(MISTAKE_ABORT)
         std::abort();  // the abort
 #endif
