@@ -25,7 +25,7 @@ constexpr uintptr_t kOverflowReach = 64 * 1024;
 const char kOverflow[] = "a stack overflow: a recursion that does not end, or too much on the stack";
 // The render thread's own stack for the JVM's handler and this one.
 constexpr std::size_t kOwnStackBytes = 256 * 1024;
-// The files to remove that fit on rm's command line.
+// The files to remove that fit on rm's command line at most.
 constexpr std::size_t kMostRemoved = 64;
 
 char gProgram[64];
@@ -153,9 +153,9 @@ void removeHalfWritten(pid_t reporter) {
     if (paths.empty()) return;
     std::size_t count = 0;
     for (const char* word : {"rm", "-rf", "--"}) gArguments[count++] = word;
-    for (std::size_t path = 0; path < paths.size() && path < kMostRemoved; ++path) {
-        gArguments[count++] = paths[path].c_str();
-    }
+    // The newest: the live window adds a folder for each reload, and removes all but the one loading.
+    const std::size_t oldest = paths.size() > kMostRemoved ? paths.size() - kMostRemoved : 0;
+    for (std::size_t path = oldest; path < paths.size(); ++path) gArguments[count++] = paths[path].c_str();
     gArguments[count] = nullptr;
     HelperProgram::run(gArguments, -1, nullptr, 0);
 }
