@@ -16,8 +16,9 @@
 
 namespace {
 
-const char* const kVertex = "attribute vec4 aPosition;\nvoid main() {\n    gl_Position = aPosition;\n}\n";
-const char* const kFragment =
+// Each variant uses some of these, none all.
+[[maybe_unused]] const char* const kVertex = "attribute vec4 aPosition;\nvoid main() {\n    gl_Position = aPosition;\n}\n";
+[[maybe_unused]] const char* const kFragment =
 #if defined(MISTAKE_SHADER)
     "precision mediump float;\nvoid main() {\n    gl_FragColor = vec4(0.2, 0.3, 0.4 1.0);\n}\n";
 #else
@@ -59,8 +60,8 @@ public:
     }
 
 private:
-    int* mCounts = nullptr;
-    void (*mPrepare)() = nullptr;
+    [[maybe_unused]] int* mCounts = nullptr;
+    [[maybe_unused]] void (*mPrepare)() = nullptr;
 };
 
 }  // namespace
