@@ -80,9 +80,9 @@ void dropCompilerNotes(char* function, char* place) {
 // addr2line's answer holds, for each address (a line "0x..."), pairs of
 // lines, function then file:line in it, from the innermost function inlined
 // there out to the frame's own. The place told is the first in the author's
-// own sources, with its function; the fault's own place when there is none. Without debug information there is no place, and
-// the symbol table may still name the fault's function: false, with that
-// name in `function` when it has one.
+// own sources, with its function; the fault's own place when there is none.
+// Without debug information there is no place, and the symbol table may
+// still name the fault's function: false, with that name in `function`.
 bool describePlace(char* answer, char*& function, CrashPlace::Detail& detail) {
     char* lines[kMostLines];
     const int count = splitLines(answer, lines, kMostLines);

@@ -66,7 +66,7 @@ Registers registersOf(const void* context) {
 // function pointer, and nothing has run since.
 uintptr_t returnAddress(const Registers& registers) {
     Dl_info info;
-    if (dladdr(reinterpret_cast<void*>(registers.instruction), &info)) return 0;
+    if (registers.stack == 0 || dladdr(reinterpret_cast<void*>(registers.instruction), &info)) return 0;
     // A call on this CPU leaves the address on the stack, where there is no link register.
     return registers.link != 0 ? registers.link : *reinterpret_cast<const uintptr_t*>(registers.stack);
 }
@@ -176,8 +176,6 @@ void CrashReport::watch(const std::string& program) {
     for (int signal : kSignals) sigaction(signal, &action, nullptr);
     installed = true;
 }
-
-void CrashReport::watchEffect(const std::string& path) { CrashPlace::watchEffect(path); }
 
 void CrashReport::beginWrite() {
     gWriter = currentThread();

@@ -21,8 +21,6 @@ class CrashReport {
 public:
     // Installs the handler once; `program` starts each message ("vi-player").
     static void watch(const std::string& program);
-    // The plug-in the runtime is about to open: its frames are the effect's.
-    static void watchEffect(const std::string& path);
     // Around each write into the files the handler removes (one writing
     // thread): the handler waits for a write under way, and a write that
     // would begin after the handler has started waits for the process to end.

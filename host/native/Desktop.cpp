@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "Application/Application.h"
+#include "CrashPlace.h"
 #include "CrashReport.h"
 #include "FatalExit.h"
 #include "Tools/DirectoryAssetManager.h"
@@ -153,7 +154,7 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(explainFatalExits)(JNIEnv* env, jclass, js
 
 JNIEXPORT void JNICALL DESKTOP_NATIVE(watchEffect)(JNIEnv* env, jclass, jstring path) {
     const char* chars = env->GetStringUTFChars(path, nullptr);
-    CrashReport::watchEffect(chars);
+    CrashPlace::watchEffect(chars);
     env->ReleaseStringUTFChars(path, chars);
 }
 
