@@ -45,7 +45,12 @@ const Effect* effectAt(const char* path) {
     return nullptr;
 }
 
-bool isUnknown(const char* place) { return std::strncmp(place, "??", 2) == 0; }
+// "??" for a function or a place addr2line cannot name; "Fx.cpp:?" for a
+// place whose file the symbol table knows and whose line only debug information would.
+bool isUnknown(const char* place) {
+    const std::size_t length = std::strlen(place);
+    return std::strncmp(place, "??", 2) == 0 || (length >= 2 && std::strcmp(place + length - 2, ":?") == 0);
+}
 
 bool isSystemHeader(const char* place) {
     return std::strncmp(place, "/usr/include/", 13) == 0 || std::strncmp(place, "/usr/lib/", 9) == 0;

@@ -45,6 +45,7 @@ done < <(cat <<ROWS
 139;error: the effect crashed: SIGSEGV (a read or write through a bad pointer, at 0x0)^$(at "null write" draw);$m/libvi_mistake_nullwrite.so
 139;error: the effect crashed: SIGSEGV^$(at "null call" "Mistake::draw()");$m/libvi_mistake_nullcall.so
 139;error: the effect crashed: SIGSEGV (a stack overflow^deeper(int) at $source:;$m/libvi_mistake_recursion.so
+139;Mistake::draw() at libvi_mistake_nodebug.so+0x^the library has no debug information^build it with -g to see the file and line;$m/libvi_mistake_nodebug.so
 134;error: the effect crashed: SIGABRT (abort() was called^$(at abort "Mistake::draw()");$m/libvi_mistake_abort.so
 ROWS
 # Each kind of bad timeline line, after a comment and a good event: the file, the line and the problem.
