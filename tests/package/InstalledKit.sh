@@ -70,4 +70,10 @@ status=0
   status=$?
 [ $status -eq 0 ] || fail "the kit's vi-player ended with status $status"
 [ -f "$work/out/frame-00000.png" ] || fail "the kit's vi-player wrote no frame"
+# A launcher copied away from the kit says so.
+cp "$kit/bin/vi-player" "$work/links/copied-vi-player"
+status=0
+message=$("$work/links/copied-vi-player" --help 2>&1) || status=$?
+[ $status -eq 2 ] && [[ $message == "vi-player: error: the kit's files are not where this launcher looks"* ]] ||
+  fail "a launcher away from its kit ended with status $status: ${message:0:300}"
 echo "the kit installs, moves, builds the README's effect and plays it"
