@@ -21,6 +21,7 @@ bool parseFloat(const std::string& text, float& value) {
 std::string ConverterOptions::usage() {
     return "usage: vi-modelconv [options] INPUT OUTPUT.bin\n"
            "       vi-modelconv --info FILE.bin\n"
+           "       vi-modelconv --check FILE.bin...\n"
            "\n"
            "Converts a mesh file that assimp reads (OBJ, glTF/GLB, PLY, STL, FBX, ...) into the\n"
            "effect runtime's model file: little-endian u32 V, u32 I, V x 3 float positions,\n"
@@ -33,7 +34,10 @@ std::string ConverterOptions::usage() {
            "Refused (non-zero status, nothing written):\n"
            "  - more than 65536 vertices after joining (16-bit indices cannot address them);\n"
            "  - a mesh without texture coordinates, unless --generate-uv is given;\n"
-           "  - a file that cannot be read or holds no triangles.\n"
+           "  - a file that cannot be read or holds no triangles;\n"
+           "  - a file whose declared sizes cannot be real: an OFF or PLY header that\n"
+           "    declares more elements than the file holds, or any file that would need\n"
+           "    more than 2 GiB + 16 x its size of memory to read.\n"
            "\n"
            "options:\n"
            "  --generate-uv[=MODE]  project texture coordinates for meshes that have none;\n"
@@ -55,6 +59,8 @@ std::string ConverterOptions::usage() {
            "  --quiet               print nothing on success\n"
            "  --info FILE.bin       print V, I, triangles and bounds of a model file and check\n"
            "                        its size, index count and indices against V and I\n"
+           "  --check FILE.bin...   check model files (as --info does) and say what is wrong\n"
+           "                        with each bad one; status 1 if any is bad\n"
            "  -h, --help            show this text\n";
 }
 
@@ -75,6 +81,8 @@ bool ConverterOptions::parse(const std::vector<std::string>& arguments, std::str
             action = Help;
         } else if (argument == "--info") {
             action = Info;
+        } else if (argument == "--check") {
+            action = Check;
         } else if (argument == "--generate-uv") {
             generateUv = true;
         } else if (argument.rfind("--generate-uv=", 0) == 0) {
@@ -123,6 +131,14 @@ bool ConverterOptions::parse(const std::vector<std::string>& arguments, std::str
             return false;
         }
         input = files[0];
+        return true;
+    }
+    if (action == Check) {
+        if (files.empty()) {
+            error = "--check takes one or more model files";
+            return false;
+        }
+        checked = files;
         return true;
     }
     if (files.size() != 2) {

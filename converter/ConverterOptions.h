@@ -15,6 +15,7 @@ public:
     enum Action {
         Convert,
         Info,
+        Check,
         Help,
     };
 
@@ -27,6 +28,7 @@ public:
     Action action = Convert;
     std::string input;
     std::string output;
+    std::vector<std::string> checked;  // --check's files
     bool generateUv = false;
     UvProjection::Mode uvMode = UvProjection::Spherical;
     bool flatNormals = false;

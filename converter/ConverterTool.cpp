@@ -1,9 +1,13 @@
 #include "ConverterTool.h"
 
+#include <cstdio>
 #include <limits>
+#include <new>
 #include <sstream>
 #include <utility>
 
+#include "DeclaredCounts.h"
+#include "MemoryCeiling.h"
 #include "MeshImporter.h"
 #include "ModelFile.h"
 #include "UvProjection.h"
@@ -12,7 +16,13 @@ namespace vi {
 
 namespace {
 
-const char* const kTool = "vi-modelconv: ";
+const char* const kTool = "vi-modelconv: error: ";
+
+std::string gigabytes(std::uint64_t bytes) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%.1f GB", double(bytes) / 1e9);
+    return text;
+}
 
 std::string formatVec3(const glm::vec3& v) {
     std::ostringstream text;
@@ -35,8 +45,20 @@ int ConverterTool::run(const std::vector<std::string>& arguments, std::ostream& 
             return 0;
         case ConverterOptions::Info:
             return info(options.input, out, err);
+        case ConverterOptions::Check:
+            return check(options, out, err);
         case ConverterOptions::Convert:
-            return convert(options, out, err);
+            break;
+    }
+    // An allocation refused under the memory ceiling, in the importer or after it.
+    try {
+        return convert(options, out, err);
+    } catch (const std::bad_alloc&) {
+        const std::uint64_t ceiling = MemoryCeiling::current();
+        err << kTool << "reading '" << options.input << "' ran out of memory";
+        if (ceiling != 0) err << " (" << gigabytes(ceiling) << " allowed)";
+        err << ": the sizes it declares cannot be real; nothing written\n";
+        return 1;
     }
     return 2;
 }
@@ -76,6 +98,10 @@ int ConverterTool::convert(const ConverterOptions& options, std::ostream& out, s
     MeshData mesh;
     std::vector<MeshImporter::MissingUv> missingUv;
     std::string error;
+    if (!DeclaredCounts::fit(options.input, error)) {
+        err << kTool << error << "; nothing written\n";
+        return 1;
+    }
     if (!MeshImporter::import(options.input, importOptions, mesh, missingUv, error)) {
         err << kTool << error << "\n";
         return 1;
@@ -119,16 +145,17 @@ int ConverterTool::convert(const ConverterOptions& options, std::ostream& out, s
 }
 
 int ConverterTool::info(const std::string& path, std::ostream& out, std::ostream& err) {
-    std::vector<std::uint8_t> bytes;
-    std::string error;
-    if (!ModelFile::readWhole(path, bytes, error)) {
-        err << kTool << error << "\n";
-        return 1;
-    }
     ModelFile::Info info;
-    if (!ModelFile::inspect(bytes, info, error)) {
-        err << kTool << "'" << path << "' is not a valid model file: " << error << "\n";
-        return 1;
+    std::string error;
+    switch (ModelFile::check(path, info, error)) {
+        case ModelFile::Valid:
+            break;
+        case ModelFile::Invalid:
+            err << kTool << "'" << path << "' is not a valid model file: " << error << "\n";
+            return 1;
+        case ModelFile::Unreadable:
+            err << kTool << error << "\n";
+            return 1;
     }
     out << "file: " << path << "\n"
         << "vertices: " << info.vertexCount << "\n"
@@ -138,6 +165,29 @@ int ConverterTool::info(const std::string& path, std::ostream& out, std::ostream
         << "bounds: min " << formatVec3(info.boundsMin) << " max " << formatVec3(info.boundsMax) << "\n"
         << "size: " << info.fileSize << " bytes, as V and I require\n";
     return 0;
+}
+
+int ConverterTool::check(const ConverterOptions& options, std::ostream& out, std::ostream& err) {
+    int status = 0;
+    for (const std::string& path : options.checked) {
+        ModelFile::Info info;
+        std::string error;
+        switch (ModelFile::check(path, info, error)) {
+            case ModelFile::Valid:
+                if (!options.quiet)
+                    out << path << ": a model of " << info.vertexCount << " vertices and " << info.triangleCount()
+                        << " triangles\n";
+                continue;
+            case ModelFile::Invalid:
+                err << kTool << "'" << path << "' cannot be a model file: " << error << "\n";
+                break;
+            case ModelFile::Unreadable:
+                err << kTool << error << "\n";
+                break;
+        }
+        status = 1;
+    }
+    return status;
 }
 
 }  // namespace vi

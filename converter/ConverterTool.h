@@ -20,6 +20,8 @@ public:
 
     static int convert(const ConverterOptions& options, std::ostream& out, std::ostream& err);
     static int info(const std::string& path, std::ostream& out, std::ostream& err);
+    // Each of --check's files: a line for a good one, an error for a bad one.
+    static int check(const ConverterOptions& options, std::ostream& out, std::ostream& err);
 
     // Centring, fitting and scaling, in that order, on positions only.
     static void placeModel(const ConverterOptions& options, MeshData& mesh);

@@ -1,6 +1,7 @@
 #include "MeshImporter.h"
 
 #include <cmath>
+#include <new>
 
 #include <assimp/Importer.hpp>
 #include <assimp/postprocess.h>
@@ -85,6 +86,9 @@ bool MeshImporter::import(const std::string& path, const Options& options, MeshD
                          aiProcess_ValidateDataStructure;
     steps |= options.flatNormals ? aiProcess_GenNormals : aiProcess_GenSmoothNormals;
     const aiScene* scene = importer.ReadFile(path, steps);
+    // The importer reports a failed allocation as its error text; the
+    // caller tells a refusal under the memory ceiling from a broken file.
+    if (!scene && std::string(importer.GetErrorString()) == std::bad_alloc().what()) throw std::bad_alloc();
     if (!scene) {
         error = "cannot read '" + path + "': " + importer.GetErrorString();
         return false;

@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cmath>
 #include <cstdio>
+#include <algorithm>
 #include <cstring>
 #include <limits>
 
@@ -77,14 +78,18 @@ std::vector<std::uint8_t> ModelFile::encode(const MeshData& mesh) {
 }
 
 bool ModelFile::inspect(const std::vector<std::uint8_t>& bytes, Info& info, std::string& error) {
+    return checkCounts(bytes.data(), bytes.size(), info, error) && checkContents(bytes, info, error);
+}
+
+bool ModelFile::checkCounts(const std::uint8_t* header, std::uint64_t fileSize, Info& info, std::string& error) {
     info = Info();
-    info.fileSize = bytes.size();
-    if (bytes.size() < ModelLayout::kHeaderSize) {
-        error = "the file has " + std::to_string(bytes.size()) + " bytes, too short for the 8-byte header";
+    info.fileSize = fileSize;
+    if (fileSize < ModelLayout::kHeaderSize) {
+        error = "the file has " + std::to_string(fileSize) + " bytes, too short for the 8-byte header";
         return false;
     }
-    info.vertexCount = getU32(bytes.data() + ModelLayout::kVertexCountOffset);
-    info.indexCount = getU32(bytes.data() + ModelLayout::kIndexCountOffset);
+    info.vertexCount = getU32(header + ModelLayout::kVertexCountOffset);
+    info.indexCount = getU32(header + ModelLayout::kIndexCountOffset);
     info.expectedSize = ModelLayout::fileSize(info.vertexCount, info.indexCount);
     const std::string counts =
         "V = " + std::to_string(info.vertexCount) + " and I = " + std::to_string(info.indexCount);
@@ -107,6 +112,10 @@ bool ModelFile::inspect(const std::vector<std::uint8_t>& bytes, Info& info, std:
                 " must be a multiple of 3";
         return false;
     }
+    return true;
+}
+
+bool ModelFile::checkContents(const std::vector<std::uint8_t>& bytes, Info& info, std::string& error) {
     const std::uint8_t* indices = bytes.data() + ModelLayout::indicesOffset(info.vertexCount);
     for (std::uint32_t i = 0; i < info.indexCount; ++i) {
         std::uint16_t index = getU16(indices + 2 * i);
@@ -132,6 +141,38 @@ bool ModelFile::inspect(const std::vector<std::uint8_t>& bytes, Info& info, std:
         }
     }
     return true;
+}
+
+ModelFile::Verdict ModelFile::check(const std::string& path, Info& info, std::string& error) {
+    // The counts are checked against the file's length before its contents
+    // are read, so that a large file of other data costs one small read.
+    std::FILE* file = std::fopen(path.c_str(), "rb");
+    if (!file) {
+        error = "cannot open '" + path + "': " + describeErrno();
+        return Unreadable;
+    }
+    struct stat status;
+    std::uint8_t header[ModelLayout::kHeaderSize];
+    const bool statted = ::fstat(fileno(file), &status) == 0;
+    const std::size_t headerRead = std::fread(header, 1, sizeof header, file);
+    std::fclose(file);
+    if (!statted || !S_ISREG(status.st_mode)) {
+        error = "'" + path + "' is not a file";
+        return Unreadable;
+    }
+    const std::uint64_t size = std::uint64_t(status.st_size);
+    if (headerRead < std::min<std::uint64_t>(size, sizeof header)) {
+        error = "cannot read '" + path + "'";
+        return Unreadable;
+    }
+    if (!checkCounts(header, size, info, error)) return Invalid;
+    std::vector<std::uint8_t> bytes;
+    if (!readWhole(path, bytes, error)) return Unreadable;
+    if (bytes.size() != size) {
+        error = "'" + path + "' changed while it was read";
+        return Unreadable;
+    }
+    return checkContents(bytes, info, error) ? Valid : Invalid;
 }
 
 bool ModelFile::writeAtomically(const std::string& path, const std::vector<std::uint8_t>& bytes,

@@ -36,10 +36,25 @@ public:
     // false with a message naming the first problem found.
     static bool inspect(const std::vector<std::uint8_t>& bytes, Info& info, std::string& error);
 
+    enum Verdict {
+        Valid,
+        Invalid,     // error: what is wrong with it, without its name
+        Unreadable,  // error: why it cannot be read, with its name
+    };
+    // inspect() for a file on disk, which is read whole only when its length
+    // matches its counts: one implementation for the converter's checks and
+    // the desktop hosts' look at an effect's assets.
+    static Verdict check(const std::string& path, Info& info, std::string& error);
+
     // Writes to a temporary file beside `path` and renames it over `path` only
     // once every byte is written, so a failure leaves no partial model behind.
     static bool writeAtomically(const std::string& path, const std::vector<std::uint8_t>& bytes,
                                 std::string& error);
+
+    // The two halves of inspect(): the 8-byte header's counts against the
+    // file's length, then the indices and positions of a file of that length.
+    static bool checkCounts(const std::uint8_t* header, std::uint64_t fileSize, Info& info, std::string& error);
+    static bool checkContents(const std::vector<std::uint8_t>& bytes, Info& info, std::string& error);
 
     static bool readWhole(const std::string& path, std::vector<std::uint8_t>& bytes, std::string& error);
 };
