@@ -2,7 +2,7 @@
 // desktop does not. A headless EGL surface kept current on the calling thread
 // (the player's render thread), the current surface's pixels, any key code,
 // the plug-in's asset directory, the window rectangle, why a plug-in does not
-// load, the preloaded clock, and the message when the effect ends the process
+// load or a file is not a model, the preloaded clock, and the message when the effect ends the process
 // or crashes.
 // The live window uses all but the surface.
 #include <EGL/egl.h>
@@ -19,6 +19,7 @@
 #include "CrashPlace.h"
 #include "CrashReport.h"
 #include "FatalExit.h"
+#include "ModelFile.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/File.h"
 
@@ -186,6 +187,17 @@ JNIEXPORT jstring JNICALL DESKTOP_NATIVE(whyNotLoadable)(JNIEnv* env, jclass, js
     const bool hasFactory = dlsym(library, "createScene") != nullptr;
     dlclose(library);
     return hasFactory ? nullptr : env->NewStringUTF("the library has no \"createScene\"");
+}
+
+// What is wrong with the file at path as a model file, or null: the
+// converter's own check, so that both say the same.
+JNIEXPORT jstring JNICALL DESKTOP_NATIVE(whyNotModel)(JNIEnv* env, jclass, jstring path) {
+    const char* chars = env->GetStringUTFChars(path, nullptr);
+    vi::ModelFile::Info info;
+    std::string error;
+    const bool valid = vi::ModelFile::check(chars, info, error) == vi::ModelFile::Valid;
+    env->ReleaseStringUTFChars(path, chars);
+    return valid ? nullptr : env->NewStringUTF(error.c_str());
 }
 
 // Sets the preloaded clock; false when the player runs without it.

@@ -3,7 +3,7 @@ package com.tarq.vi.player;
 /**
  * What a phone gives its host and a desktop does not: a headless GL surface
  * current on the calling thread, the current surface's pixels, any key code, the plug-in's asset directory,
- * the window rectangle, why a plug-in does not load, the preloaded clock, and the
+ * the window rectangle, why a plug-in does not load or a file is not a model, the preloaded clock, and the
  * message when the effect ends the process.
  * Every method must be called on the thread that opened the surface.
  */
@@ -57,6 +57,9 @@ final class Desktop {
 
     /** Why the plug-in at path cannot be started (the loader's message or the missing factory), or null. */
     static native String whyNotLoadable(String path);
+
+    /** What is wrong with the file at path as a model file (as vi-modelconv --check says it), or null. */
+    static native String whyNotModel(String path);
 
     /** Sets the runtime's realtime clock; false when the fixed clock is not preloaded. */
     static native boolean setClock(long nanoseconds);

@@ -46,6 +46,7 @@ public final class Live implements Session.Surface {
     private final int[] event = new int[3];
     private final String name;
     private PluginWatch watch;
+    private AssetModels models;
     /** The copy of the plug-in the effect runs from. */
     private Path running;
     private String lastReload = "started";
@@ -100,6 +101,8 @@ public final class Live implements Session.Surface {
         openWindow();
         try {
             if (assets != null) Desktop.setAssetDirectory(assets.toString());
+            models = new AssetModels("vi-live", assets);
+            models.check();
             watch = new PluginWatch(plugin, assets);
             running = watch.copy();
             try {
@@ -219,6 +222,7 @@ public final class Live implements Session.Surface {
      */
     private void reload() {
         watch.markLoaded();
+        models.check();
         Path copy;
         String reason;
         try {

@@ -125,6 +125,7 @@ public final class Player {
         }
         Path assets = Session.assetDirectory(plugin, options.assets);
         if (assets != null) Desktop.setAssetDirectory(assets.toString());
+        new AssetModels("vi-player", assets).check();
 
         // As the phone's host: start with the library and the window, hand in
         // the images the scene asks for, initialise, then frames.
