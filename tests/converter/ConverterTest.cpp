@@ -24,9 +24,21 @@ std::string slurp(const fs::path& path) {
     return std::string(std::istreambuf_iterator<char>(in), {});
 }
 
-// The tool's status and both its streams.
-std::pair<int, std::string> run(const std::vector<std::string>& arguments) {
-    std::string command = VI_MODELCONV;
+#if defined(VI_SANITIZED)
+constexpr bool kSanitized = true;  // whose allocator reserves address space beyond any limit
+#else
+constexpr bool kSanitized = false;
+#endif
+#if defined(VI_EMULATED)
+constexpr bool kEmulated = true;  // whose emulator keeps address-space limits to itself
+#else
+constexpr bool kEmulated = false;
+#endif
+
+// The tool's status and both its streams; under a memory limit when `limited`, so that a tool
+// that believes impossible sizes fails the test instead of taking the machine's memory.
+std::pair<int, std::string> run(const std::vector<std::string>& arguments, bool limited) {
+    std::string command = std::string(limited ? "prlimit --as=3000000000 " : "") + VI_MODELCONV;
     for (const std::string& argument : arguments) command += " '" + argument + "'";
     const int raw = std::system((command + " >" + kDir.string() + ".log 2>&1").c_str());
     return {WIFEXITED(raw) ? WEXITSTATUS(raw) : -1, slurp(kDir.string() + ".log")};
@@ -75,11 +87,21 @@ struct Case {
     const char* name;
     const char* extension;
     std::string input;
-    std::vector<std::string> options;       // before the input; "--info" takes no output
+    std::vector<std::string> options;       // before the input; "--info" and "--check" take no output
     int status;
     const char* message;                    // in its output
     std::function<void(const Model&)> check;  // on out.bin after a success
+    bool impossible = false;                // sizes that cannot be real: run under a memory limit
 };
+
+// Files whose headers declare 400 million elements in a few hundred bytes.
+const std::string kTriangleOff = "OFF\n3 1 0\n0 0 0\n1 0 0\n0 1 0\n3 0 1 2\n";
+const std::string kHugeOff = "OFF\n3 400000000 0\n0 0 0\n1 0 0\n0 1 0\n3 0 1 2\n";
+const std::string kHugeBinaryPly = "ply\nformat binary_little_endian 1.0\nelement vertex 400000000\n"
+                                   "property float x\nproperty float y\nproperty float z\nelement face 1\n"
+                                   "property list uchar int vertex_indices\nend_header\n" + std::string(52, '\0');
+const std::string kHugeX = "xof 0303txt 0032\nMesh m {\n 400000000;\n 0.0;0.0;0.0;,\n 1.0;0.0;0.0;,\n"
+                           " 0.0;1.0;0.0;;\n 1;\n 3;0,1,2;;\n}\n";
 
 
 const Case kCases[] = {
@@ -109,6 +131,17 @@ const Case kCases[] = {
      }},
     {"InfoRefusesHugeCountsInAShortFile", ".bin", std::string(8, '\xff') + "abc", {"--info"}, 1,
      "truncated: 11 bytes, but V = 4294967295 and I = 4294967295 need 146028888038", nullptr},
+    {"CheckNamesABrokenModel", ".bin", std::string("\xe8\x03\0\0\x03\0\0\0", 8), {"--check"}, 1,
+     "in.bin' cannot be a model file: the file is truncated: 8 bytes, but V = 1000 and I = 3 need 32014", nullptr},
+    {"ARealOffFileFitsItsCounts", ".off", kTriangleOff, {"--generate-uv"}, 0, "3 vertices", [](const Model& m) {
+         EXPECT_EQ(m.positions, (std::vector<glm::vec3>{{0, 0, 0}, {1, 0, 0}, {0, 1, 0}}));
+     }},
+    {"OffCountsBeyondTheFileAreRefused", ".off", kHugeOff, {}, 1,
+     "in.off' declares 3 vertices and 400000000 faces but holds 44 bytes, while they need 800000018", nullptr, true},
+    {"PlyCountsBeyondTheFileAreRefused", ".ply", kHugeBinaryPly, {}, 1,
+     "in.ply' declares 400000000 vertex elements and 1 face element but holds 229 bytes", nullptr, true},
+    {"OtherSizesThatCannotBeRealMeetTheCeiling", ".x", kHugeX, {}, 1,
+     kEmulated ? "in.x' ran out of memory (" : "in.x' ran out of memory (2.1 GB allowed)", nullptr, true},
 };
 
 void PrintTo(const Case& row, std::ostream* out) { *out << row.name; }
@@ -121,13 +154,15 @@ protected:
 
 TEST_P(Converter, Converts) {
     const Case& row = GetParam();
+    if (row.impossible && kSanitized) GTEST_SKIP() << "a memory limit stops the sanitizer's allocator itself";
     const fs::path input = kDir / (std::string("in") + row.extension), out = kDir / "out.bin";
     std::ofstream(input, std::ios::binary) << row.input;
     std::ofstream(out) << "old";
     std::vector<std::string> arguments = row.options;
     arguments.push_back(input.string());
-    if (row.options != std::vector<std::string>{"--info"}) arguments.push_back(out.string());
-    const auto [status, output] = run(arguments);
+    if (row.options.empty() || (row.options[0] != "--info" && row.options[0] != "--check"))
+        arguments.push_back(out.string());
+    const auto [status, output] = run(arguments, row.impossible);
     ASSERT_EQ(status, row.status) << output;
     EXPECT_THAT(output, testing::HasSubstr(row.message));
     // No temporary file left behind; a refusal leaves an earlier output as it was.

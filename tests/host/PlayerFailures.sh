@@ -11,6 +11,8 @@ at() { echo "$2^ at $source:$(grep -n "// the $1" "$source" | cut -d: -f1)"; }
 rm -rf "$4" && mkdir -p "$4/assets" && cd "$4" || exit 1
 echo "not a picture" | tee broken.png > libgarbage.so
 echo "beside the asset folder" > secret
+# A model file whose counts promise far more than its 8 bytes: warned about, and the effect starts.
+printf '\350\003\0\0\003\0\0\0' > assets/broken.bin
 failures=0 n=0
 fail() { echo "FAIL ($args): $*"; cat stderr.txt; failures=$((failures + 1)); }
 
@@ -39,7 +41,7 @@ done < <(cat <<ROWS
 2;--image takes NAME=FILE;--image wallpaper $plugin
 88;error: the fragment shader does not compile (the effect ended with status 88)^shader line 3:     gl_FragColor = vec4(0.2, 0.3, 0.4 1.0);$m/libvi_mistake_shader.so
 67;error: the shader program does not link (the effect ended with status 67)^vGlow;$m/libvi_mistake_link.so
-71;asset that does not exist (the effect ended with status 71)^ghost.bin, searched in $(pwd -P)/assets;--assets assets $m/libvi_mistake_ghost.so
+71;asset that does not exist (the effect ended with status 71)^ghost.bin, searched in $(pwd -P)/assets^warning: the asset broken.bin cannot be a model file: the file is truncated: 8 bytes, but V = 1000 and I = 3 need 32014;--assets assets $m/libvi_mistake_ghost.so
 71;asset outside its asset folder (the effect ended with status 71)^../secret leads out of $(pwd -P)/assets;--assets assets $m/libvi_mistake_secret.so
 45;could not open a file (the effect ended with status 45)^nowhere.txt, searched in $(pwd -P);$m/libvi_mistake_file.so
 139;error: the effect crashed: SIGSEGV (a read or write through a bad pointer, at 0x0)^$(at "null write" draw);$m/libvi_mistake_nullwrite.so
