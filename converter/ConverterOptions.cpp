@@ -36,7 +36,7 @@ std::string ConverterOptions::usage() {
            "  - a mesh without texture coordinates, unless --generate-uv is given;\n"
            "  - a file that cannot be read or holds no triangles;\n"
            "  - a file whose declared sizes cannot be real: an OFF or PLY header that\n"
-           "    declares more elements than the file holds, or any file that would need\n"
+           "    declares far more elements than the file holds, or any file that would need\n"
            "    more than 2 GiB + 16 x its size of memory to read.\n"
            "\n"
            "options:\n"
