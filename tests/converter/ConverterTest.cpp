@@ -98,7 +98,7 @@ struct Case {
 const std::string kTriangleOff = "OFF\n3 1 0\n0 0 0\n1 0 0\n0 1 0\n3 0 1 2\n";
 const std::string kHugeOff = "OFF\n3 400000000 0\n0 0 0\n1 0 0\n0 1 0\n3 0 1 2\n";
 const std::string kHugeBinaryPly = "ply\nformat binary_little_endian 1.0\nelement vertex 400000000\n"
-                                   "property float x\nproperty float y\nproperty float z\nelement face 1\n"
+                                   "comment not a property\nproperty float x\nproperty float y\nproperty float z\nelement face 1\n"
                                    "property list uchar int vertex_indices\nend_header\n" + std::string(52, '\0');
 const std::string kHugeX = "xof 0303txt 0032\nMesh m {\n 400000000;\n 0.0;0.0;0.0;,\n 1.0;0.0;0.0;,\n"
                            " 0.0;1.0;0.0;;\n 1;\n 3;0,1,2;;\n}\n";
@@ -133,13 +133,16 @@ const Case kCases[] = {
      "truncated: 11 bytes, but V = 4294967295 and I = 4294967295 need 146028888038", nullptr},
     {"CheckNamesABrokenModel", ".bin", std::string("\xe8\x03\0\0\x03\0\0\0", 8), {"--check"}, 1,
      "in.bin' cannot be a model file: the file is truncated: 8 bytes, but V = 1000 and I = 3 need 32014", nullptr},
+    {"CheckFindsAnIndexPastTheLastVertex", ".bin",
+     std::string("\3\0\0\0\3\0\0\0", 8) + std::string(96, '\0') + std::string("\0\0\1\0\3\0", 6), {"--check"}, 1,
+     "in.bin' cannot be a model file: index 2 is 3, past the last vertex 3 - 1", nullptr},
     {"ARealOffFileFitsItsCounts", ".off", kTriangleOff, {"--generate-uv"}, 0, "3 vertices", [](const Model& m) {
          EXPECT_EQ(m.positions, (std::vector<glm::vec3>{{0, 0, 0}, {1, 0, 0}, {0, 1, 0}}));
      }},
     {"OffCountsBeyondTheFileAreRefused", ".off", kHugeOff, {}, 1,
      "in.off' declares 3 vertices and 400000000 faces but holds 44 bytes, while they need 800000018", nullptr, true},
     {"PlyCountsBeyondTheFileAreRefused", ".ply", kHugeBinaryPly, {}, 1,
-     "in.ply' declares 400000000 vertex elements and 1 face element but holds 229 bytes", nullptr, true},
+     "in.ply' declares 400000000 vertex elements and 1 face element but holds 252 bytes", nullptr, true},
     {"OtherSizesThatCannotBeRealMeetTheCeiling", ".x", kHugeX, {}, 1,
      kEmulated ? "in.x' ran out of memory (" : "in.x' ran out of memory (2.1 GB allowed)", nullptr, true},
 };
