@@ -60,7 +60,6 @@ int ConverterTool::run(const std::vector<std::string>& arguments, std::ostream& 
         err << ": the sizes it declares cannot be real; nothing written\n";
         return 1;
     }
-    return 2;
 }
 
 void ConverterTool::bounds(const MeshData& mesh, glm::vec3& boundsMin, glm::vec3& boundsMax) {
