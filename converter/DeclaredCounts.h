@@ -22,10 +22,10 @@ public:
     // (the importer says why).
     static bool fit(const std::string& path, std::string& error);
 
+private:
     // The same for a file's first bytes (up to its end of header) and its length.
     static bool fit(const std::string& head, std::uint64_t fileSize, std::string& error);
 
-private:
     struct Element {
         std::string name;
         std::uint64_t count;

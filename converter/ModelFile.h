@@ -51,12 +51,13 @@ public:
     static bool writeAtomically(const std::string& path, const std::vector<std::uint8_t>& bytes,
                                 std::string& error);
 
+    static bool readWhole(const std::string& path, std::vector<std::uint8_t>& bytes, std::string& error);
+
+private:
     // The two halves of inspect(): the 8-byte header's counts against the
     // file's length, then the indices and positions of a file of that length.
     static bool checkCounts(const std::uint8_t* header, std::uint64_t fileSize, Info& info, std::string& error);
     static bool checkContents(const std::vector<std::uint8_t>& bytes, Info& info, std::string& error);
-
-    static bool readWhole(const std::string& path, std::vector<std::uint8_t>& bytes, std::string& error);
 };
 
 }  // namespace vi
