@@ -39,6 +39,10 @@ done < <(cat <<ROWS
 2;no plug-in given;--fixed-step
 2;--fps takes a whole number from 1 to 240, not "0";--fps 0 $plugin
 2;--image takes NAME=FILE;--image wallpaper $plugin
+2;--update goes with --compare DIR;--update $plugin
+2;--tolerance takes a whole number from 0 to 255, not "256";--compare . --tolerance 256 $plugin
+1;error: the reference folder nowhere does not exist^to make it from this render: --compare nowhere --update;--compare nowhere $plugin
+1;--out and --compare name the same folder result;--compare result $plugin
 88;error: the fragment shader does not compile (the effect ended with status 88)^shader line 3:     gl_FragColor = vec4(0.2, 0.3, 0.4 1.0);$m/libvi_mistake_shader.so
 67;error: the shader program does not link (the effect ended with status 67)^vGlow;$m/libvi_mistake_link.so
 71;asset that does not exist (the effect ended with status 71)^ghost.bin, searched in $(pwd -P)/assets^warning: the asset broken.bin cannot be a model file: the file is truncated: 8 bytes, but V = 1000 and I = 3 need 32014;--assets assets $m/libvi_mistake_ghost.so

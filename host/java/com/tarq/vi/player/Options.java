@@ -2,6 +2,7 @@ package com.tarq.vi.player;
 
 import java.nio.file.Path;
 import java.util.LinkedHashMap;
+import java.util.List;
 import java.util.Map;
 import java.util.Set;
 
@@ -23,8 +24,18 @@ final class Options {
         "                       renders repeat bit for bit (default: real time, paced)",
         "  --out DIR            output folder (default out); replaced only if the player wrote it",
         "  --sheet N            frames on the contact sheet (default 8)",
+        "  --compare DIR        compare each frame with the picture of its name in DIR; a frame",
+        "                       that differs gets a diff picture (diff-NNNNN.png) beside it,",
+        "                       and the run ends with status 1. Implies --fixed-step",
+        "  --tolerance N        with --compare: a channel may differ by up to N (0-255, default 8)",
+        "  --allow-pixels N     with --compare: pixels a frame may have beyond the tolerance",
+        "                       (default 0)",
+        "  --update             with --compare: make this render's frames the references in DIR",
         "  --quiet              no progress",
         "  --help               this text");
+
+    /** The largest surface side. */
+    private static final int MAX_SIDE = 8192;
 
     Path plugin;
     Path timeline;
@@ -39,6 +50,10 @@ final class Options {
     int sheetFrames = 8;
     boolean quiet;
     boolean help;
+    Path compare;
+    int tolerance = 8;
+    int allowedPixels;
+    boolean update;
 
     /** Thrown for a command line the player cannot use; the message says why. */
     static final class UsageException extends Exception {
@@ -56,6 +71,7 @@ final class Options {
     /** Parses only the options in `accepted` (all when null); any other is unknown. */
     static Options parse(String[] args, Set<String> accepted) throws UsageException {
         Options options = new Options();
+        String comparing = null;  // the first option that needs --compare
         for (int i = 0; i < args.length; ++i) {
             String arg = args[i];
             if (!arg.startsWith("--")) {
@@ -86,11 +102,15 @@ final class Options {
                     String size = value(args, ++i, arg);
                     String[] parts = size.split("x");
                     if (parts.length != 2) throw new UsageException("--size takes WxH, not \"" + size + "\"");
-                    options.width = positive(parts[0], "--size width", 8192);
-                    options.height = positive(parts[1], "--size height", 8192);
+                    options.width = whole(parts[0], "--size width", 1, MAX_SIDE);
+                    options.height = whole(parts[1], "--size height", 1, MAX_SIDE);
                 }
-                case "--fps" -> options.fps = positive(value(args, ++i, arg), "--fps", 240);
-                case "--sheet" -> options.sheetFrames = positive(value(args, ++i, arg), "--sheet", 64);
+                case "--fps" -> options.fps = whole(value(args, ++i, arg), "--fps", 1, 240);
+                case "--sheet" -> options.sheetFrames = whole(value(args, ++i, arg), "--sheet", 1, 64);
+                case "--compare" -> options.compare = Path.of(value(args, ++i, arg));
+                case "--tolerance" -> options.tolerance = whole(value(args, ++i, arg), arg, 0, 255);
+                case "--allow-pixels" -> options.allowedPixels = whole(value(args, ++i, arg), arg, 0, MAX_SIDE * MAX_SIDE);
+                case "--update" -> options.update = true;
                 case "--duration" -> {
                     String text = value(args, ++i, arg);
                     try {
@@ -104,8 +124,12 @@ final class Options {
                 }
                 default -> throw new UsageException("unknown option " + arg);
             }
+            if (comparing == null && List.of("--tolerance", "--allow-pixels", "--update").contains(arg)) comparing = arg;
         }
         if (options.plugin == null) throw new UsageException("no plug-in given");
+        if (options.compare == null && comparing != null) throw new UsageException(comparing + " goes with --compare DIR");
+        // A comparison needs the same frames on every run.
+        if (options.compare != null) options.fixedStep = true;
         return options;
     }
 
@@ -114,13 +138,13 @@ final class Options {
         return args[index];
     }
 
-    private static int positive(String text, String what, int limit) throws UsageException {
+    private static int whole(String text, String what, int from, int to) throws UsageException {
         try {
             int value = Integer.parseInt(text);
-            if (value >= 1 && value <= limit) return value;
+            if (value >= from && value <= to) return value;
         } catch (NumberFormatException e) {
             // reported below
         }
-        throw new UsageException(what + " takes a whole number from 1 to " + limit + ", not \"" + text + "\"");
+        throw new UsageException(what + " takes a whole number from " + from + " to " + to + ", not \"" + text + "\"");
     }
 }

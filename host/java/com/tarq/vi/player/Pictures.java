@@ -18,7 +18,8 @@ import javax.imageio.stream.ImageOutputStream;
 
 /**
  * The pictures of a render: every frame as PNG, a contact sheet of chosen
- * frames labelled with their times, and an animated GIF preview. Frames of
+ * frames labelled with their times, an animated GIF preview, and the diff
+ * pictures of frames that differ from their references. Frames of
  * another orientation are fitted, letterboxed, into the first frame's shape.
  */
 final class Pictures implements AutoCloseable {
@@ -70,6 +71,15 @@ final class Pictures implements AutoCloseable {
 
     static String frameName(int index) {
         return String.format("frame-%05d.png", index);
+    }
+
+    /** How frame `index` differs from its reference, beside the frame. */
+    static String diffName(int index) {
+        return String.format("diff-%05d.png", index);
+    }
+
+    void addDiff(int index, BufferedImage picture) throws IOException {
+        ImageIO.write(picture, "png", folder.resolve(diffName(index)).toFile());
     }
 
     /** Writes frame `index` (drawn at `seconds`) and keeps what the sheet and the preview need of it. */

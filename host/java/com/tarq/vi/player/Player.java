@@ -26,6 +26,8 @@ public final class Player {
     private final Options options;
     private final Session session;
     private final Native host;
+    /** With --compare, what the frames are held against; else null. */
+    private final References references;
     /** Held while writing into the partial folder, and by the shutdown hook that removes it. */
     private final Object partialLock = new Object();
     /** Set by the shutdown hook (Ctrl-C, SIGTERM) once it has removed the partial folder. */
@@ -33,6 +35,8 @@ public final class Player {
 
     private Player(Options options) {
         this.options = options;
+        references = options.compare == null ? null
+            : new References(options.compare, options.out, options.tolerance, options.allowedPixels);
         session = new Session("vi-player", options.width, options.height);
         host = session.host;
     }
@@ -48,18 +52,18 @@ public final class Player {
             }
             status = 0;
         } catch (Options.UsageException e) {
-            System.err.println("vi-player: " + e.getMessage());
+            System.err.println("vi-player: error: " + e.getMessage());
             System.err.println(Options.USAGE);
             status = 2;
         } catch (Failure | TimelineException e) {
-            System.err.println("vi-player: " + e.getMessage());
+            System.err.println("vi-player: error: " + e.getMessage());
             status = 1;
         } catch (IOException e) {
-            System.err.println("vi-player: " + e.getMessage());
+            System.err.println("vi-player: error: " + e.getMessage());
             status = 1;
         } catch (IllegalStateException | UnsatisfiedLinkError e) {
             // The headless surface or a library of the player's own: no use going on.
-            System.err.println("vi-player: " + e.getMessage());
+            System.err.println("vi-player: error: " + e.getMessage());
             status = 1;
         }
         System.exit(status);
@@ -81,6 +85,13 @@ public final class Player {
         if (Files.exists(out) && !Files.exists(out.resolve(MARK))) {
             throw new Failure("output folder " + options.out + " exists and was not written by the player;"
                 + " remove it or choose another with --out");
+        }
+        if (references != null) {
+            if (out.equals(options.compare.toAbsolutePath().normalize())) {
+                throw new Failure("--out and --compare name the same folder " + options.out
+                    + "; the references would be replaced by the render");
+            }
+            references.checkFolder(options.update);
         }
 
         double duration = duration(timeline);
@@ -116,6 +127,22 @@ public final class Player {
             options.fixedStep ? ", fixed step" : "");
         System.out.println("contact sheet: " + out.resolve(Pictures.SHEET));
         System.out.println("preview:       " + out.resolve(Pictures.PREVIEW));
+        if (references != null) reportComparison(out, frames);
+    }
+
+    /** After the render is in place: the references updated, or each frame that fails named. */
+    private void reportComparison(Path out, int frames) throws Failure, IOException {
+        if (options.update) {
+            System.out.println("references:    " + references.update(out, frames));
+            return;
+        }
+        references.checkForExtras(frames);
+        if (references.failures().isEmpty()) {
+            System.out.println("compared:      " + frames + " frames with " + options.compare + ", all within the tolerance");
+            return;
+        }
+        for (String failure : references.failures()) System.err.println("vi-player: error: " + failure);
+        throw new Failure(references.failureSummary());
     }
 
     private void play(Path plugin, Timeline timeline, int frames, Pictures pictures) throws Failure, IOException {
@@ -155,8 +182,10 @@ public final class Player {
             BufferedImage image = session.readFrame();
             frameTimes.add(System.nanoTime() - drawn);
             int written = frame;
+            BufferedImage diff = references == null || options.update ? null : references.compare(frame, image);
             write(() -> {
                 pictures.add(written, seconds, image);
+                if (diff != null) pictures.addDiff(written, diff);
                 return null;
             });
             progress.frameDone(frame);
