@@ -27,6 +27,7 @@ final class References {
     private final int tolerance;
     private final int allowedPixels;
     private final List<String> failures = new ArrayList<>();
+    private int diffPictures;
 
     /** `folder` and `out` as the author gave them, for the messages. */
     References(Path folder, Path out, int tolerance, int allowedPixels) {
@@ -70,6 +71,7 @@ final class References {
         }
         FrameDifference difference = FrameDifference.of(frame, reference, tolerance);
         if (difference.differing() <= allowedPixels) return null;
+        ++diffPictures;
         failures.add(name + " differs from its reference in " + count(difference.differing(), "pixel") + ", by up to "
             + difference.largest() + ": " + out.resolve(Pictures.diffName(index)));
         return difference.picture();
@@ -93,7 +95,8 @@ final class References {
     String failureSummary() {
         return "the render does not match its references in " + folder + " (" + count(failures.size(), "frame")
             + "; tolerance " + tolerance + " a channel, " + count(allowedPixels, "pixel") + " allowed)\n"
-            + "  the frames and diff pictures are in " + out + "; to make this render the reference, add --update";
+            + "  the frames" + (diffPictures > 0 ? " and diff pictures" : "") + " are in " + out
+            + "; to make this render the reference, add --update";
     }
 
     /**
