@@ -25,7 +25,7 @@ while IFS= read -r -d '' file; do
 done < <(find "$kit" -type f -name '*.so' -print0; find "$kit/bin" -type f -print0)
 
 # Every tool answers --help.
-for tool in vi-player vi-live vi-modelconv; do
+for tool in vi-player vi-live vi-modelconv vi-new; do
   usage=$(timeout 60 "$kit/bin/$tool" --help) || fail "$tool --help ended with status $?"
   [[ $usage == "usage: $tool "* ]] || fail "$tool --help printed: ${usage:0:200}"
 done

@@ -1,0 +1,81 @@
+#!/usr/bin/env bash
+# vi-new as an author meets it: from an installed kit moved elsewhere, the
+# names and folders it must refuse (each with its message, nothing written),
+# then a new project built with the runtime's own compiler and standard
+# library, its ctest recording the reference frames, comparing with them,
+# failing with a diff picture on a changed reference, and recording anew when
+# asked.
+# Usage: NewEffect.sh BUILD_DIR CXX CXX_FLAGS LINKER_FLAGS
+set -euo pipefail
+build=$1 cxx=$2 cxxflags=$3 ldflags=$4
+work=$(mktemp -d "${TMPDIR:-/tmp}/vi-new.XXXXXX")
+trap 'rm -rf "$work"' EXIT
+fail() { echo "FAIL: $*" >&2; exit 1; }
+
+kit="$work/moved kit"
+cmake --install "$build" --prefix "$work/first" --component tarqvevyn >/dev/null
+mv "$work/first" "$kit"
+authors=$work/author
+mkdir -p "$authors/taken" "$authors/empty"
+touch "$authors/taken/notes.txt"
+
+# arguments | status | the message's first line starts with
+refusals=(
+  "taken|1|vi-new: error: taken already exists; vi-new never writes over it"
+  "glow taken|1|vi-new: error: taken already exists"
+  "my-glow|1|vi-new: error: 'my-glow' is not a C++ identifier"
+  "2glow|1|vi-new: error: '2glow' is not a C++ identifier"
+  "class|1|vi-new: error: 'class' is a C++ keyword"
+  "test|1|vi-new: error: 'test' is one of CMake's own target names"
+  "a__b|1|vi-new: error: 'a__b' is reserved for the compiler"
+  "glow missing/glow|1|vi-new: error: the folder missing, where missing/glow would go, does not exist"
+  "|2|vi-new: error: give the effect's name"
+  "--force glow|2|vi-new: error: unknown option '--force'"
+)
+before=$(cd "$authors" && find . | sort)
+for row in "${refusals[@]}"; do
+  IFS='|' read -r arguments expected start <<<"$row"
+  status=0
+  # shellcheck disable=SC2086
+  message=$(cd "$authors" && "$kit/bin/vi-new" $arguments 2>&1 >/dev/null) || status=$?
+  [ $status -eq "$expected" ] && [[ $message == "$start"* ]] ||
+    fail "vi-new $arguments ended with status $status (expected $expected): ${message:0:300}"
+  [ "$(cd "$authors" && find . | sort)" = "$before" ] || fail "vi-new $arguments left files behind"
+done
+(cd "$authors" && "$kit/bin/vi-new" fine empty >/dev/null) && [ -f "$authors/empty/FineScene.cpp" ] ||
+  fail "vi-new did not write into an empty folder"
+
+cd "$authors"
+"$kit/bin/vi-new" glow >/dev/null || fail "vi-new glow ended with status $?"
+cmake -S glow -B glow/build -DCMAKE_PREFIX_PATH="$kit" -DCMAKE_CXX_COMPILER="$cxx" -DCMAKE_CXX_FLAGS="$cxxflags" \
+  -DCMAKE_SHARED_LINKER_FLAGS="$ldflags" >"$work/configure.log" 2>&1 ||
+  { cat "$work/configure.log"; fail "the new effect does not configure against the moved kit"; }
+cmake --build glow/build >"$work/build.log" 2>&1 || { cat "$work/build.log"; fail "the new effect does not build"; }
+
+run_ctest() {  # the test's line from ctest's summary, and its status
+  status=0
+  ctest --test-dir glow/build --output-on-failure --timeout 300 >"$work/ctest.log" 2>&1 || status=$?
+}
+run_ctest
+[ $status -eq 0 ] || { cat "$work/ctest.log"; fail "the first ctest did not pass"; }
+grep -q "glow.golden (no references yet: records them) \.* *Passed" "$work/ctest.log" ||
+  { cat "$work/ctest.log"; fail "the first ctest did not say it records the references"; }
+[ "$(find glow/golden -name 'frame-*.png' | wc -l)" -eq 10 ] || fail "the first ctest did not record 10 frames"
+
+run_ctest
+[ $status -eq 0 ] && grep -q "glow.golden \.* *Passed" "$work/ctest.log" ||
+  { cat "$work/ctest.log"; fail "the second ctest did not compare and pass"; }
+
+cp glow/golden/frame-00000.png glow/golden/frame-00005.png
+run_ctest
+[ $status -ne 0 ] || { cat "$work/ctest.log"; fail "a changed reference frame did not fail the test"; }
+grep -q "frame-00005.png differs from its reference" "$work/ctest.log" ||
+  { cat "$work/ctest.log"; fail "the failure does not name the changed frame"; }
+[ -f glow/build/glow.golden-frames/diff-00005.png ] && [ "$(ls glow/build/glow.golden-frames/diff-*)" = \
+  "glow/build/glow.golden-frames/diff-00005.png" ] || fail "the failure did not write exactly diff-00005.png"
+
+VI_UPDATE_GOLDENS=1 run_ctest
+[ $status -eq 0 ] && grep -q "VI_UPDATE_GOLDENS: records them" "$work/ctest.log" || fail "VI_UPDATE_GOLDENS did not record"
+run_ctest
+[ $status -eq 0 ] || { cat "$work/ctest.log"; fail "the references recorded anew do not pass"; }
+echo "vi-new refuses what it must and makes an effect that builds, records its references and holds to them"
