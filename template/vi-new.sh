@@ -70,11 +70,14 @@ fi
 # Never over anything: a folder may exist only if it is empty.
 if [ -e "$dir" ] || [ -L "$dir" ]; then
   if [ ! -d "$dir" ] || [ -L "$dir" ] || [ -n "$(ls -A "$dir")" ]; then
-    fail 1 "$dir already exists; vi-new never writes over it" "give another folder as the second argument, or remove this one"
+    fail 1 "$dir already exists and is not an empty folder; vi-new never writes over it" \
+      "give another folder as the second argument, or remove this one"
   fi
 fi
-parent=$(dirname "$dir")
-[ -d "$parent" ] || fail 1 "the folder $parent, where $dir would go, does not exist"
+# Absolute, so that "." and "glow/" work as well as "glow".
+target=$(realpath -m -- "$dir")
+parent=$(dirname "$target")
+[ -d "$parent" ] || fail 1 "the folder $(dirname "$dir"), where $dir would go, does not exist"
 [ -w "$parent" ] || fail 1 "the folder $parent, where $dir would go, cannot be written to"
 
 class="${name^}Scene"
@@ -102,9 +105,20 @@ fill gitignore.in .gitignore
 cp "$template/wallpaper.png" "$staging/wallpaper.png"
 chmod "$(printf '%o' $((0777 & ~$(umask))))" "$staging"
 
-# A rename: it replaces an empty folder, and fails rather than write into one
-# that something else filled meanwhile.
-mv -T "$staging" "$dir" 2>/dev/null || fail 1 "$dir could not be written (it exists now, or its folder changed)"
-trap - EXIT
+# A new folder is the staging folder renamed, whole. An empty one may be the
+# current folder (vi-new glow .), so it stays and the files move into it;
+# should that fail, it is emptied again.
+if [ -d "$target" ]; then
+  written=("$staging"/* "$staging"/.gitignore)
+  if ! mv -n -t "$target" -- "${written[@]}" 2>/dev/null || [ -n "$(ls -A "$staging")" ]; then
+    (cd "$target" && rm -rf -- "${written[@]##*/}")
+    fail 1 "$dir could not be written (something else wrote into it meanwhile)"
+  fi
+else
+  mv -T "$staging" "$target" 2>/dev/null || fail 1 "$dir could not be written (it exists now, or its folder changed)"
+  trap - EXIT
+fi
 echo "vi-new: wrote the effect $name into $dir"
-echo "  next: cd $dir, then the three commands in its README.md (build, open in the live window, test)"
+where="cd $dir, then "
+[ "$target" != "$(pwd -P)" ] || where=""
+echo "  next: ${where}the three commands in its README.md (build, open in the live window, test)"

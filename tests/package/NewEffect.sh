@@ -16,11 +16,11 @@ kit="$work/moved kit"
 cmake --install "$build" --prefix "$work/first" --component tarqvevyn >/dev/null
 mv "$work/first" "$kit"
 authors=$work/author
-mkdir -p "$authors/taken/notes" "$authors/glow"  # an empty folder is vi-new's to fill
+mkdir -p "$authors/taken/notes" "$authors/glow"  # an empty folder is vi-new's to fill, even the current one
 
 # arguments | status | the message's first line starts with
 refusals=(
-  "taken|1|vi-new: error: taken already exists; vi-new never writes over it"
+  "taken|1|vi-new: error: taken already exists and is not an empty folder; vi-new never writes over it"
   "my-glow|1|vi-new: error: 'my-glow' is not a C++ identifier"
   "class|1|vi-new: error: 'class' is a C++ keyword"
   "test|1|vi-new: error: 'test' is one of CMake's own target names"
@@ -40,7 +40,9 @@ for row in "${refusals[@]}"; do
   [ "$(cd "$authors" && find . | sort)" = "$before" ] || fail "vi-new $arguments left files behind"
 done
 cd "$authors"
-"$kit/bin/vi-new" glow >/dev/null || fail "vi-new glow ended with status $?"
+(cd glow && "$kit/bin/vi-new" glow . >/dev/null) || fail "vi-new glow . ended with status $?"
+"$kit/bin/vi-new" other >/dev/null && [ -f other/OtherScene.cpp ] && [ "$(ls -A | tr '\n' ' ')" = "glow other taken " ] ||
+  fail "vi-new other ended with status $? and left: $(ls -A)"
 { cmake -S glow -B glow/build -DCMAKE_PREFIX_PATH="$kit" -DCMAKE_CXX_COMPILER="$cxx" -DCMAKE_CXX_FLAGS="$cxxflags" \
   -DCMAKE_SHARED_LINKER_FLAGS="$ldflags" && cmake --build glow/build; } >"$work/build.log" 2>&1 ||
   { cat "$work/build.log"; fail "the new effect does not configure and build against the moved kit"; }
