@@ -13,10 +13,9 @@ trap 'rm -rf "$work"' EXIT
 fail() { echo "FAIL: $*" >&2; exit 1; }
 
 kit="$work/moved kit"
-cmake --install "$build" --prefix "$work/first" --component tarqvevyn >/dev/null
-mv "$work/first" "$kit"
-authors=$work/author
-mkdir -p "$authors/taken/notes" "$authors/glow"  # an empty folder is vi-new's to fill, even the current one
+cmake --install "$build" --prefix "$work/first" --component tarqvevyn >/dev/null && mv "$work/first" "$kit"
+# An empty folder is vi-new's to fill, even the current one.
+mkdir -p "$work/author/taken/notes" "$work/author/glow" && cd "$work/author"
 
 # arguments | status | the message's first line starts with
 refusals=(
@@ -29,17 +28,16 @@ refusals=(
   "|2|vi-new: error: give the effect's name"
   "--force glow|2|vi-new: error: unknown option '--force'"
 )
-before=$(cd "$authors" && find . | sort)
+before=$(find . | sort)
 for row in "${refusals[@]}"; do
   IFS='|' read -r arguments expected start <<<"$row"
   status=0
   # shellcheck disable=SC2086
-  message=$(cd "$authors" && "$kit/bin/vi-new" $arguments 2>&1 >/dev/null) || status=$?
+  message=$("$kit/bin/vi-new" $arguments 2>&1 >/dev/null) || status=$?
   [ $status -eq "$expected" ] && [[ $message == "$start"* ]] ||
     fail "vi-new $arguments ended with status $status (expected $expected): ${message:0:300}"
-  [ "$(cd "$authors" && find . | sort)" = "$before" ] || fail "vi-new $arguments left files behind"
+  [ "$(find . | sort)" = "$before" ] || fail "vi-new $arguments left files behind"
 done
-cd "$authors"
 (cd glow && "$kit/bin/vi-new" glow . >/dev/null) || fail "vi-new glow . ended with status $?"
 "$kit/bin/vi-new" other >/dev/null && [ -f other/OtherScene.cpp ] && [ "$(ls -A | tr '\n' ' ')" = "glow other taken " ] ||
   fail "vi-new other ended with status $? and left: $(ls -A)"
