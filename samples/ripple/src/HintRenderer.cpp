@@ -1,5 +1,6 @@
 #include "HintRenderer.h"
 
+#include "Helpers/DrawableArrays.h"
 #include "Render/Uniform.h"
 
 namespace vi {
@@ -37,8 +38,7 @@ const char* HintRenderer::fragmentSource() {
 
 HintRenderer::HintRenderer(ShaderProgram& program, Drawable& quad, const Inputs& inputs)
     : Renderer(program, quad) {
-    addAttribute("aPosition", quad.positions, 3, quad.positionsStatic);
-    addAttribute("aTextureCoord", quad.texCoords, 2, quad.texCoordsStatic);
+    DrawableArrays::bind(*this);
     addUniform("uPhase", inputs.phase, Uniform::Float, 1);
     addUniform("uAlpha", inputs.alpha, Uniform::Float, 1);
     addUniform("uColour", inputs.colour, Uniform::Float3, 1);

@@ -8,6 +8,7 @@
 
 #include "Application/AnimationManager.h"
 #include "AssetAccess.h"
+#include "Helpers/DrawableArrays.h"
 #include "HintRenderer.h"
 #include "ProceduralTextures.h"
 #include "Render/Background.h"
@@ -63,20 +64,6 @@ constexpr unsigned int kFallbackWidth = 360;
 constexpr unsigned int kFallbackHeight = 640;
 constexpr unsigned int kGemTextureWidth = 64;
 constexpr unsigned int kGemTextureHeight = 32;
-
-// Points a drawable at a rectangle's arrays (four vertices, a triangle strip).
-void fillFromRectangle(Drawable& drawable, const GeometryRectangle& rectangle, bool positionsStatic) {
-    drawable.mode = GL_TRIANGLE_STRIP;
-    drawable.indices = rectangle.indices.data();
-    drawable.elementCount = unsigned(rectangle.indices.size());
-    drawable.vertexCount = unsigned(rectangle.positions.size());
-    drawable.positions = &rectangle.positions[0].x;
-    drawable.normals = &rectangle.normals[0].x;
-    drawable.texCoords = &rectangle.texCoords[0].x;
-    drawable.positionsStatic = positionsStatic;
-    drawable.normalsStatic = true;
-    drawable.texCoordsStatic = true;
-}
 
 template <typename T>
 void deleteAndClear(T*& pointer) {
@@ -173,14 +160,12 @@ void RippleScene::setUp() {
     if (mIsSetUp) return;
     mIsSetUp = true;
 
-    mScreenQuad.construct(glm::vec3(-1.0f, -1.0f, 0.0f), glm::vec2(2.0f, 2.0f));
-    fillFromRectangle(mScreenDrawable, mScreenQuad, true);
     mWaterProgram = new ShaderProgram(WaterRenderer::vertexSource(), WaterRenderer::fragmentSource());
     mGradeFrom = ToneGrades::create(mGrade);
     mGradeTo = ToneGrades::create(mGrade);
 
     mHintQuad.construct(glm::vec3(-0.1f, -0.1f, 0.0f), glm::vec2(0.2f, 0.2f));
-    fillFromRectangle(mHintDrawable, mHintQuad, false);
+    DrawableArrays::pointAt(mHintDrawable, mHintQuad, true);  // placed anew for each layout
     mHintProgram = new ShaderProgram(HintRenderer::vertexSource(), HintRenderer::fragmentSource());
     mHintRenderer = new HintRenderer(*mHintProgram, mHintDrawable, HintRenderer::Inputs{&mHintPhase, &mHintAlpha,
                                                                                        &mHintColour});
@@ -229,7 +214,7 @@ void RippleScene::useWallpaper(Texture* wallpaper) {
     delete mWaterRenderer;
     WaterRenderer::Inputs inputs{mField.mRipples, mField.mAmplitudes, &mWallpaperTransform, &mScreenScale,
                                  &mGradeBlend,    &mGradeStrength,    &mGemShadow};
-    mWaterRenderer = new WaterRenderer(*mWaterProgram, mScreenDrawable, mWallpaper, mGradeFrom->getTexture(),
+    mWaterRenderer = new WaterRenderer(*mWaterProgram, mScreenQuad.drawable(), mWallpaper, mGradeFrom->getTexture(),
                                        mGradeTo->getTexture(), inputs);
     mWaterRenderers.assign(1, mWaterRenderer);
 }

@@ -25,6 +25,7 @@
 
 #include "Application/Scene.h"
 #include "FadeAnimation.h"
+#include "Helpers/FullScreenQuad.h"
 #include "Render/Drawable.h"
 #include "Render/GeometryRectangle.h"
 #include "RippleField.h"
@@ -102,8 +103,7 @@ private:
 
     // The water and the window.
     ShaderProgram* mWaterProgram;
-    GeometryRectangle mScreenQuad;
-    Drawable mScreenDrawable;
+    FullScreenQuad mScreenQuad;
     WaterRenderer* mWaterRenderer;
     std::vector<Renderer*> mWaterRenderers;
     RenderableTexture* mWaterTarget;

@@ -1,5 +1,6 @@
 #include "WaterRenderer.h"
 
+#include "Helpers/DrawableArrays.h"
 #include "Render/Texture.h"
 #include "Render/Uniform.h"
 
@@ -104,7 +105,7 @@ glm::vec4 WaterRenderer::coverTransform(const glm::vec2& textureSize, const glm:
 WaterRenderer::WaterRenderer(ShaderProgram& program, Drawable& quad, Texture* wallpaper, Texture* gradeFrom,
                              Texture* gradeTo, const Inputs& inputs)
     : Renderer(program, quad) {
-    addAttribute("aPosition", quad.positions, 3, quad.positionsStatic);
+    DrawableArrays::bind(*this);
     addTexture("uWallpaper", wallpaper);
     addTexture("uGradeFrom", gradeFrom);
     addTexture("uGradeTo", gradeTo);
