@@ -17,6 +17,13 @@ constexpr unsigned int kPositionComponents = 3;
 constexpr unsigned int kNormalComponents = 3;
 constexpr unsigned int kTextureCoordComponents = 2;
 
+// An array the geometry has and the shaders do not read is no mistake, so it
+// is not offered: the desktop hosts warn about a name the program lacks.
+void bindIfUsed(Renderer& renderer, const char* name, const float* data, unsigned int components, bool isStatic) {
+    if (data && glGetAttribLocation(renderer.program->program, name) != -1)
+        renderer.addAttribute(name, data, components, isStatic);
+}
+
 }  // namespace
 
 void DrawableArrays::pointAt(Drawable& drawable, const Geometry& geometry, bool positionsMove) {
@@ -34,12 +41,9 @@ void DrawableArrays::pointAt(Drawable& drawable, const Geometry& geometry, bool 
 
 void DrawableArrays::bind(Renderer& renderer) {
     const Drawable& drawable = *renderer.drawable;
-    if (drawable.positions)
-        renderer.addAttribute(kPosition, drawable.positions, kPositionComponents, drawable.positionsStatic);
-    if (drawable.normals)
-        renderer.addAttribute(kNormal, drawable.normals, kNormalComponents, drawable.normalsStatic);
-    if (drawable.texCoords)
-        renderer.addAttribute(kTextureCoord, drawable.texCoords, kTextureCoordComponents, drawable.texCoordsStatic);
+    bindIfUsed(renderer, kPosition, drawable.positions, kPositionComponents, drawable.positionsStatic);
+    bindIfUsed(renderer, kNormal, drawable.normals, kNormalComponents, drawable.normalsStatic);
+    bindIfUsed(renderer, kTextureCoord, drawable.texCoords, kTextureCoordComponents, drawable.texCoordsStatic);
 }
 
 }  // namespace vi

@@ -28,8 +28,7 @@ public:
     static void pointAt(Drawable& drawable, const Geometry& geometry, bool positionsMove = false);
 
     // Adds the drawable's non-null arrays to the renderer as kPosition,
-    // kNormal and kTextureCoord; one the program does not use is dropped, as
-    // every binding by name is.
+    // kNormal and kTextureCoord, those the program uses (a lookup each, now).
     static void bind(Renderer& renderer);
 };
 

@@ -2,8 +2,8 @@
 // desktop does not. A headless EGL surface kept current on the calling thread
 // (the player's render thread), the current surface's pixels, any key code,
 // the plug-in's asset directory, the window rectangle, why a plug-in does not
-// load or a file is not a model, the preloaded clock, and the message when the effect ends the process
-// or crashes.
+// load or a file is not a model, the preloaded clock, the message when the effect ends the process
+// or crashes, and the names it binds that its programs do not have.
 // The live window uses all but the surface.
 #include <EGL/egl.h>
 #include <EGL/eglext.h>
@@ -22,6 +22,7 @@
 #include "ModelFile.h"
 #include "Tools/DirectoryAssetManager.h"
 #include "Tools/File.h"
+#include "UnboundNameWarnings.h"
 
 #define DESKTOP_NATIVE(method) Java_com_tarq_vi_player_Desktop_##method
 
@@ -153,9 +154,12 @@ JNIEXPORT void JNICALL DESKTOP_NATIVE(explainFatalExits)(JNIEnv* env, jclass, js
     env->ReleaseStringUTFChars(program, chars);
 }
 
+JNIEXPORT void JNICALL DESKTOP_NATIVE(tellUnboundNames)(JNIEnv* env, jclass) { UnboundNameWarnings::listen(env); }
+
 JNIEXPORT void JNICALL DESKTOP_NATIVE(watchEffect)(JNIEnv* env, jclass, jstring path) {
     const char* chars = env->GetStringUTFChars(path, nullptr);
     CrashPlace::watchEffect(chars);
+    UnboundNameWarnings::forget();
     env->ReleaseStringUTFChars(path, chars);
 }
 

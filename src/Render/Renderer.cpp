@@ -1,10 +1,12 @@
 #include "Render/Renderer.h"
 
 #include <algorithm>
+#include <iterator>
 
 #include "Render/NamedValues.h"
 #include "Render/RenderTargetFrame.h"
 #include "Render/Texture.h"
+#include "Render/UnboundNames.h"
 
 namespace vi {
 
@@ -12,6 +14,37 @@ std::vector<Renderer*> Renderer::mAllRenderers;
 EGLContext Renderer::mEglContext = EGL_NO_CONTEXT;
 
 namespace {
+
+// The uniforms every renderer binds by itself when its program has them, and
+// the companions of each sampler it binds: name + kSize, name + kTexelSize.
+const char* const kModelMatrix = "uModelMatrix";
+const char* const kViewMatrix = "uViewMatrix";
+const char* const kNormalMatrix = "uNormalMatrix";
+const char* const kProjectionMatrix = "uProjectionMatrix";
+const char* const kModelViewProjectionMatrix = "uModelViewProjectionMatrix";
+const char* const kOpacity = "uOpacity";
+const char* const kBoundByItself[] = {kModelMatrix,      kViewMatrix, kNormalMatrix,
+                                      kProjectionMatrix, kModelViewProjectionMatrix, kOpacity};
+const char* const kSize = "Size";
+const char* const kTexelSize = "TexelSize";
+
+bool isBoundByItself(const std::string& name) {
+    return std::find(std::begin(kBoundByItself), std::end(kBoundByItself), name) != std::end(kBoundByItself);
+}
+
+// ---- Platform difference: who hears of a name the program does not have ----
+// The phone drops the binding silently. A desktop host may listen and tell the
+// author, who has most likely misspelt the name.
+#if defined(__ANDROID__)
+enum class Unbound { Attribute, Uniform, Sampler };
+void tellUnbound(const ShaderProgram&, Unbound, const std::string&) {}
+#else
+using Unbound = UnboundNames::Kind;
+void tellUnbound(const ShaderProgram& program, Unbound kind, const std::string& name) {
+    UnboundNames::tell(program, kind, name);
+}
+#endif
+// ---------------------------------------------------------------------------
 
 GLsizeiptr attributeBytes(const Attribute& attribute) {
     return GLsizeiptr(*attribute.vertexCount) * attribute.components * sizeof(float);
@@ -51,6 +84,19 @@ void createAttributeBuffer(Attribute& attribute) {
     glVertexAttribPointer(attribute.location, attribute.components, GL_FLOAT, GL_FALSE, 0, 0);
 }
 
+// A uniform record when the program has the name; -1 and nothing kept when not.
+int appendUniform(Renderer& renderer, const std::string& name, const void* data, Uniform::UniformType type,
+                  unsigned int count) {
+    Uniform* uniform = new Uniform{name, -1, data, type, count};
+    uniform->location = glGetUniformLocation(renderer.program->program, name.c_str());
+    if (uniform->location == -1) {
+        delete uniform;
+        return -1;
+    }
+    renderer.uniforms.push_back(uniform);
+    return int(renderer.uniforms.size()) - 1;
+}
+
 }  // namespace
 
 Renderer::Renderer(ShaderProgram& programToUse, Drawable& drawableToDraw)
@@ -58,12 +104,12 @@ Renderer::Renderer(ShaderProgram& programToUse, Drawable& drawableToDraw)
     if (drawable->indices) createIndexBuffer(indexBuffer, *drawable);
 
     // Bound when the program uses them; the derived ones are refreshed by render().
-    addUniform("uModelMatrix", &drawable->modelMatrix[0][0], Uniform::Matrix4, 1);
-    addUniform("uViewMatrix", &Drawable::mViewMatrix[0][0], Uniform::Matrix4, 1);
-    addUniform("uNormalMatrix", &drawable->normalMatrix[0][0], Uniform::Matrix3, 1);
-    addUniform("uProjectionMatrix", &Drawable::mProjectionMatrix[0][0], Uniform::Matrix4, 1);
-    addUniform("uModelViewProjectionMatrix", &drawable->modelViewProjectionMatrix[0][0], Uniform::Matrix4, 1);
-    addUniform("uOpacity", &drawable->opacity, Uniform::Float, 1);
+    appendUniform(*this, kModelMatrix, &drawable->modelMatrix[0][0], Uniform::Matrix4, 1);
+    appendUniform(*this, kViewMatrix, &Drawable::mViewMatrix[0][0], Uniform::Matrix4, 1);
+    appendUniform(*this, kNormalMatrix, &drawable->normalMatrix[0][0], Uniform::Matrix3, 1);
+    appendUniform(*this, kProjectionMatrix, &Drawable::mProjectionMatrix[0][0], Uniform::Matrix4, 1);
+    appendUniform(*this, kModelViewProjectionMatrix, &drawable->modelViewProjectionMatrix[0][0], Uniform::Matrix4, 1);
+    appendUniform(*this, kOpacity, &drawable->opacity, Uniform::Float, 1);
 
     mAllRenderers.push_back(this);
 }
@@ -102,6 +148,7 @@ int Renderer::addAttribute(const std::string& name, const void* data, unsigned i
     Attribute* attribute = new Attribute{name, kNoBuffer, -1, data, &drawable->vertexCount, components, isStatic};
     if (!locate(*attribute, program->program)) {
         deleteAttribute(attribute);
+        tellUnbound(*program, Unbound::Attribute, name);
         return -1;
     }
     createAttributeBuffer(*attribute);
@@ -110,28 +157,26 @@ int Renderer::addAttribute(const std::string& name, const void* data, unsigned i
 }
 
 int Renderer::addUniform(const std::string& name, const void* data, Uniform::UniformType type, unsigned int count) {
-    Uniform* uniform = new Uniform{name, -1, data, type, count};
-    uniform->location = glGetUniformLocation(program->program, name.c_str());
-    if (uniform->location == -1) {
-        delete uniform;
-        return -1;
-    }
-    uniforms.push_back(uniform);
-    return int(uniforms.size()) - 1;
+    const int index = appendUniform(*this, name, data, type, count);
+    if (index == -1 && !isBoundByItself(name)) tellUnbound(*program, Unbound::Uniform, name);
+    return index;
 }
 
 int Renderer::addTexture(const std::string& name, Texture* texture) {
     if (!texture) return -1;
     const GLint location = glGetUniformLocation(program->program, name.c_str());
-    if (location == -1) return -1;
+    if (location == -1) {
+        tellUnbound(*program, Unbound::Sampler, name);
+        return -1;
+    }
 
     texture->allocate();
     textures.emplace_back(texture, location);
     if (texture->mKind == kRenderTargetTexture) renderTargets.push_back(texture);
     const int unit = int(textures.size()) - 1;
 
-    addUniform(name + "Size", &texture->mSize[0], Uniform::Float2, 1);
-    addUniform(name + "TexelSize", &texture->mTexelSize[0], Uniform::Float2, 1);
+    appendUniform(*this, name + kSize, &texture->mSize[0], Uniform::Float2, 1);
+    appendUniform(*this, name + kTexelSize, &texture->mTexelSize[0], Uniform::Float2, 1);
     return unit;
 }
 

@@ -3,10 +3,10 @@
 # each mistake that ends the effect, its status, the message's key words
 # ('^' between them), and no output folder (nor a partial one) left behind.
 # A crash in the effect is its signal's status, its name, the effect's function and file:line,
-# and neither a JVM banner nor a crash file.
-# usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR MISTAKE_PLUGINS_DIR MISTAKE_SOURCE
+# and neither a JVM banner nor a crash file. A misspelt name is a warning, once, and the run goes on.
+# usage: PlayerFailures.sh PLAYER PLUGIN NOFACTORY_PLUGIN SCRATCH_DIR MISTAKE_PLUGINS_DIR MISTAKE_SOURCE PICTURE
 set -uo pipefail
-player="$1" plugin="$2" nofactory="$3" m="$5" source="$6"
+player="$1" plugin="$2" nofactory="$3" m="$5" source="$6" picture="$7"
 at() { echo "$2^ at $source:$(grep -n "// the $1" "$source" | cut -d: -f1)"; }
 rm -rf "$4" && mkdir -p "$4/assets" && cd "$4" || exit 1
 echo "not a picture" | tee broken.png > libgarbage.so
@@ -70,6 +70,27 @@ NaN unlock|3: "NaN" is not a time in seconds
 1 image wallpaper missing.png|3: cannot read image
 LINES
 )
+
+# Misspelt names: the run writes its frames, with this many warnings, their key words among them.
+# The first three are one run's: of two renderers of one program, told once each, and never the
+# names a renderer binds by itself. The last run is right, a lost context and all: no warning.
+printf '0 image wallpapr %s\n' "$picture" > misspelt.timeline
+printf '0.1 lose-context\n0.2 image wallpaper %s\n0.3 touch down 60 200\n' "$picture" > right.timeline
+while IFS='|' read -r count message args; do
+  # shellcheck disable=SC2086  # the arguments are words
+  "$player" --quiet --out result --duration 0.4 $args > stdout.txt 2> stderr.txt || fail "status $?"
+  [ -f result/frame-00011.png ] || fail "no frames"
+  [ "$(grep -c warning: stderr.txt)" -eq "$count" ] || fail "not $count warnings"
+  while read -r -d '^' part; do grep -qF -- "$part" stderr.txt || fail "no \"$part\""; done <<< "${message:+$message^}"
+  rm -rf result
+done <<ROWS
+3|warning: the uniform 'uGlw' is not an active uniform of its program^did you mean 'uGlow'?^$(at "misspelt uniform" "")^the program's active uniforms: uGlow, uTime|$m/libvi_mistake_names.so
+3|warning: the attribute 'aPositon' is not an active attribute^did you mean 'aPosition'?^$(at "misspelt attribute" "")|$m/libvi_mistake_names.so
+3|warning: the sampler 'uPictur' is not an active sampler^did you mean 'uPicture'?^the program's active samplers: uPicture|$m/libvi_mistake_names.so
+2|warning: the image 'wallpaperr' is handed in but the effect never asks for it; did you mean 'wallpaper'?^given by --image wallpaperr^warning: the effect asks for the image 'wallpaper' but none is handed in; did you mean 'wallpaperr'?|--image wallpaperr=$picture $plugin
+1|warning: the image 'wallpapr' is handed in but the effect never asks for it; did you mean 'wallpaper'?^given by misspelt.timeline:1|--image wallpaper=$picture --timeline misspelt.timeline $plugin
+0||--timeline right.timeline $plugin
+ROWS
 
 # Ctrl-C, SIGTERM, or a crash's signal from outside once the output folder is being written: the
 # signal's status, nothing left behind, and the sender of a crash's signal named.

@@ -3,8 +3,8 @@ package com.tarq.vi.player;
 /**
  * What a phone gives its host and a desktop does not: a headless GL surface
  * current on the calling thread, the current surface's pixels, any key code, the plug-in's asset directory,
- * the window rectangle, why a plug-in does not load or a file is not a model, the preloaded clock, and the
- * message when the effect ends the process.
+ * the window rectangle, why a plug-in does not load or a file is not a model, the preloaded clock, the
+ * message when the effect ends the process, and the names it binds that its programs do not have.
  * Every method must be called on the thread that opened the surface.
  */
 final class Desktop {
@@ -36,8 +36,16 @@ final class Desktop {
     static native void explainFatalExits(String program);
 
     /**
+     * From now on each name the effect binds (an attribute, a uniform, a
+     * sampler) that its program does not have goes to Misspellings.unbound,
+     * once per program and name.
+     */
+    static native void tellUnboundNames();
+
+    /**
      * The plug-in the runtime is about to open: when the process crashes in
-     * it, the message names the effect's function and source line (see explainFatalExits).
+     * it, the message names the effect's function and source line (see
+     * explainFatalExits). Its names are told again (see tellUnboundNames).
      */
     static native void watchEffect(String path);
 

@@ -95,6 +95,7 @@ public final class Live implements Session.Surface {
         Path assets = Session.assetDirectory(plugin, options.assets);
         Session.loadLibraries("vi-live", "vi.window");
         Desktop.explainFatalExits("vi-live");
+        Misspellings.watch("vi-live");
         if (!Desktop.setClock(Player.FIXED_CLOCK_START)) {
             throw new Failure("the clock library is not preloaded; start it with vi-live");
         }
@@ -106,7 +107,7 @@ public final class Live implements Session.Surface {
             watch = new PluginWatch(plugin, assets);
             running = watch.copy();
             try {
-                if (!session.start(running.toString(), false)) {
+                if (!session.start(running.toString())) {
                     String reason = Desktop.whyNotLoadable(running.toString());
                     throw new Failure("cannot start the effect in " + options.plugin + ": "
                         + (reason != null ? reason : "the runtime refused it"));
@@ -232,7 +233,7 @@ public final class Live implements Session.Surface {
             copy = null;
             reason = "cannot copy it: " + e.getMessage();
         }
-        boolean started = copy != null && reason == null && session.start(copy.toString(), true);
+        boolean started = copy != null && reason == null && session.start(copy.toString());
         if (copy != null) PluginWatch.discard(copy);
         if (started) {
             running = copy;
@@ -243,7 +244,7 @@ public final class Live implements Session.Surface {
             if (reason == null) {
                 // The running copy is gone from the disk, but the loader still holds it under its path.
                 reason = "the runtime refused it";
-                session.start(running.toString(), true);
+                session.start(running.toString());
             }
             lastReload = "reload failed " + LocalTime.now().format(CLOCK) + ": " + reason;
             System.err.println("vi-live: the new build of " + options.plugin + " does not load, the running effect"

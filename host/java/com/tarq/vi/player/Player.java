@@ -78,7 +78,7 @@ public final class Player {
         }
         for (Timeline.Event event : timeline.events()) {
             if (event.kind().equals("image")) {
-                session.decode(imagePath(event), options.timeline + ":" + event.line());
+                session.addLaterImage(event.arguments().get(0), imagePath(event), options.timeline + ":" + event.line());
             }
         }
         Path out = options.out.toAbsolutePath().normalize();
@@ -102,6 +102,7 @@ public final class Player {
         Runtime.getRuntime().addShutdownHook(new Thread(() -> abandon(partial)));
         Session.loadLibraries("vi-player");
         Desktop.explainFatalExits("vi-player");
+        Misspellings.watch("vi-player");
         Desktop.removeOnFatalExit(partial.toString());
         try {
             Pictures pictures = write(() -> {
@@ -156,7 +157,7 @@ public final class Player {
 
         // As the phone's host: start with the library and the window, hand in
         // the images the scene asks for, initialise, then frames.
-        if (!session.start(plugin.toString(), options.quiet)) {
+        if (!session.start(plugin.toString())) {
             String reason = Desktop.whyNotLoadable(plugin.toString());
             throw new Failure("cannot start the effect in " + options.plugin + ": "
                 + (reason != null ? reason : "the runtime refused it"));

@@ -53,6 +53,8 @@ final class Session {
     private final int startHeight;
     private final Map<Path, Image> decoded = new HashMap<>();
     private final Map<String, Image> images = new LinkedHashMap<>();
+    // Every image name given, at start or by the timeline, with where it was given.
+    private final Map<String, String> givenAt = new LinkedHashMap<>();
     private int width;
     private int height;
     private int orientation;
@@ -104,25 +106,29 @@ final class Session {
     /** An image handed in at every start, decoded now so that a bad file stops the host first. */
     void addImage(String name, Path file, String where) throws IOException {
         images.put(name, decode(file, where));
+        givenAt.putIfAbsent(name, where);
+    }
+
+    /** An image a timeline event hands in later, at the place given; decoded now. */
+    void addLaterImage(String name, Path file, String where) throws IOException {
+        decode(file, where);
+        givenAt.putIfAbsent(name, where);
     }
 
     /**
      * As the phone's host starts an effect: the library and the window, the
      * images the scene asks for (and the others given), its orientation, then
-     * initialisation. Returns false when the runtime refuses the library.
+     * initialisation. A name asked for and not given, or given and not asked
+     * for, is warned about. Returns false when the runtime refuses the library.
      */
-    boolean start(String library, boolean quiet) {
+    boolean start(String library) {
         Desktop.watchEffect(library);
         String[] names = host.prehandleStart(library, width, height);
         if (names == null) return false;
+        Misspellings.images(List.of(names), givenAt);
         for (String name : names) {
             Image image = images.get(name);
-            if (image != null) {
-                loadTexture(name, image);
-            } else if (!quiet) {
-                System.err.println(program + ": the effect asks for an image \"" + name
-                    + "\"; none given (--image " + name + "=FILE), it shows its own");
-            }
+            if (image != null) loadTexture(name, image);
         }
         for (Map.Entry<String, Image> image : images.entrySet()) {
             if (!List.of(names).contains(image.getKey())) loadTexture(image.getKey(), image.getValue());
