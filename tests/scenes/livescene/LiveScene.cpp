@@ -12,7 +12,8 @@ namespace {
 
 class LiveScene : public vi::Scene {
 public:
-    explicit LiveScene(const int* size) : vi::Scene(size) {}
+    // It asks for a picture it never shows, so that the window's warnings about images can be seen.
+    explicit LiveScene(const int* size) : vi::Scene(size) { mNames = {"wallpaper"}; }
     void touchDown(const glm::vec2& position) override { mTouches.push_back(position); }
     void touchMove(const glm::vec2& position) override { mTouches.push_back(position); }
 

@@ -44,9 +44,13 @@ class LiveWindowTest {
         assertTrue(crash.contains("vi-live: error: the effect crashed: SIGSEGV") && crash.contains("draw")
             && crash.contains("Mistake.cpp:") && crash.endsWith("status 139"), crash);
 
-        live = new ProcessBuilder(viLive, "--size", "180x320", plugin.toString())
-            .directory(scratch.toFile()).redirectOutput(log.toFile()).redirectErrorStream(true).start();
+        // A misspelt image: a warning with the nearest name, once for the whole session, reloads and all.
+        live = new ProcessBuilder(viLive, "--size", "180x320", "--image", "wallpapr=" + System.getProperty("vi.picture"),
+            plugin.toString()).directory(scratch.toFile()).redirectOutput(log.toFile()).redirectErrorStream(true).start();
         awaitText("vi-live: playing");
+        String misspelt = "vi-live: warning: the image 'wallpapr' is handed in but the effect never asks for it;"
+            + " did you mean 'wallpaper'?";
+        assertTrue(Files.readString(log).contains(misspelt), Files.readString(log));
         String window = poll(() -> run("xdotool", "search", "--pid", "" + live.pid()).lines().findFirst()
             .filter(id -> !id.startsWith("status")).orElse(null));
         run("xdotool", "mousemove", "--window", window, "90", "300");
@@ -96,6 +100,7 @@ class LiveWindowTest {
         live.outputWriter().append("keycode 67\n").flush();
         awaitText("key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
+        assertEquals(1, Files.readString(log).split(misspelt, -1).length - 1, "warned once");
         run("xdotool", "key", "q");
         assertTrue(live.waitFor(20, TimeUnit.SECONDS), "q did not close the window");
         assertEquals(0, live.exitValue(), Files.readString(log));
