@@ -87,13 +87,9 @@ void createAttributeBuffer(Attribute& attribute) {
 // A uniform record when the program has the name; -1 and nothing kept when not.
 int appendUniform(Renderer& renderer, const std::string& name, const void* data, Uniform::UniformType type,
                   unsigned int count) {
-    Uniform* uniform = new Uniform{name, -1, data, type, count};
-    uniform->location = glGetUniformLocation(renderer.program->program, name.c_str());
-    if (uniform->location == -1) {
-        delete uniform;
-        return -1;
-    }
-    renderer.uniforms.push_back(uniform);
+    const GLint location = glGetUniformLocation(renderer.program->program, name.c_str());
+    if (location == -1) return -1;
+    renderer.uniforms.push_back(new Uniform{name, location, data, type, count});
     return int(renderer.uniforms.size()) - 1;
 }
 
