@@ -17,8 +17,10 @@ constexpr unsigned int kPositionComponents = 3;
 constexpr unsigned int kNormalComponents = 3;
 constexpr unsigned int kTextureCoordComponents = 2;
 
-// An array the geometry has and the shaders do not read is no mistake, so it
-// is not offered: the desktop hosts warn about a name the program lacks.
+// Normals or texture coordinates the geometry has and the shaders do not
+// read are no mistake, so they are not offered: the desktop hosts warn about
+// a name the program lacks. Positions every program reads, so a program
+// without kPosition is warned about.
 void bindIfUsed(Renderer& renderer, const char* name, const float* data, unsigned int components, bool isStatic) {
     if (data && glGetAttribLocation(renderer.program->program, name) != -1)
         renderer.addAttribute(name, data, components, isStatic);
@@ -41,7 +43,8 @@ void DrawableArrays::pointAt(Drawable& drawable, const Geometry& geometry, bool 
 
 void DrawableArrays::bind(Renderer& renderer) {
     const Drawable& drawable = *renderer.drawable;
-    bindIfUsed(renderer, kPosition, drawable.positions, kPositionComponents, drawable.positionsStatic);
+    if (drawable.positions)
+        renderer.addAttribute(kPosition, drawable.positions, kPositionComponents, drawable.positionsStatic);
     bindIfUsed(renderer, kNormal, drawable.normals, kNormalComponents, drawable.normalsStatic);
     bindIfUsed(renderer, kTextureCoord, drawable.texCoords, kTextureCoordComponents, drawable.texCoordsStatic);
 }

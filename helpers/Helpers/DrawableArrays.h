@@ -28,7 +28,8 @@ public:
     static void pointAt(Drawable& drawable, const Geometry& geometry, bool positionsMove = false);
 
     // Adds the drawable's non-null arrays to the renderer as kPosition,
-    // kNormal and kTextureCoord, those the program uses (a lookup each, now).
+    // kNormal and kTextureCoord: the positions always, the other two when
+    // the program uses them (a lookup each, now).
     static void bind(Renderer& renderer);
 };
 

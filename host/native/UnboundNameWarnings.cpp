@@ -1,6 +1,7 @@
 #include "UnboundNameWarnings.h"
 
 #include <GLES2/gl2.h>
+#include <GLES2/gl2ext.h>
 
 #include <algorithm>
 #include <set>
@@ -29,7 +30,9 @@ const char* kindName(Kind kind) {
     return "";
 }
 
-bool isSampler(GLenum type) { return type == GL_SAMPLER_2D || type == GL_SAMPLER_CUBE; }
+bool isSampler(GLenum type) {
+    return type == GL_SAMPLER_2D || type == GL_SAMPLER_CUBE || type == GL_SAMPLER_EXTERNAL_OES;
+}
 
 // The program's active names of the kind, sorted. The compiler removes what
 // the shaders declare and never use, so those are not among them. An array
@@ -62,12 +65,16 @@ std::vector<std::string> activeNames(GLuint program, Kind kind) {
 
 }  // namespace
 
+// Without the class or its method (a jar of another version) nothing is told;
+// the exception is left for the caller to see.
 void UnboundNameWarnings::listen(JNIEnv* env) {
-    env->GetJavaVM(&gJavaVm);
     jclass misspellings = env->FindClass("com/tarq/vi/player/Misspellings");
-    gMisspellings = static_cast<jclass>(env->NewGlobalRef(misspellings));
-    gUnbound = env->GetStaticMethodID(gMisspellings, "unbound",
+    if (!misspellings) return;
+    gUnbound = env->GetStaticMethodID(misspellings, "unbound",
                                       "(Ljava/lang/String;Ljava/lang/String;Ljava/lang/String;[Ljava/lang/String;)V");
+    if (!gUnbound) return;
+    env->GetJavaVM(&gJavaVm);
+    gMisspellings = static_cast<jclass>(env->NewGlobalRef(misspellings));
     vi::UnboundNames::listen(onUnbound);
 }
 
@@ -75,7 +82,11 @@ void UnboundNameWarnings::forget() { gTold.clear(); }
 
 void UnboundNameWarnings::onUnbound(const vi::ShaderProgram& program, Kind kind, const std::string& name) {
     JNIEnv* env = nullptr;
-    if (gJavaVm->GetEnv(reinterpret_cast<void**>(&env), JNI_VERSION_1_6) != JNI_OK) return;
+    if (gJavaVm->GetEnv(reinterpret_cast<void**>(&env), JNI_VERSION_1_6) != JNI_OK || env->ExceptionCheck()) return;
+    // A program of a lost context, not yet rebuilt (an initialisation right
+    // after the context changed binds its stale name): nothing is found in
+    // it, and that says nothing of the names.
+    if (!glIsProgram(program.program)) return;
     const std::string told =
         std::string(kindName(kind)) + '\n' + name + '\n' + program.vertexSource + '\n' + program.fragmentSource;
     if (!gTold.insert(told).second) return;
@@ -84,7 +95,7 @@ void UnboundNameWarnings::onUnbound(const vi::ShaderProgram& program, Kind kind,
     if (!CrashPlace::describe(uintptr_t(__builtin_return_address(0)), 0, place)) place.clear();
 
     const std::vector<std::string> active = activeNames(program.program, kind);
-    env->PushLocalFrame(jint(active.size()) + 8);
+    if (env->PushLocalFrame(jint(active.size()) + 8) != 0) return;
     jobjectArray names = env->NewObjectArray(jsize(active.size()), env->FindClass("java/lang/String"), nullptr);
     for (std::size_t index = 0; index < active.size(); ++index)
         env->SetObjectArrayElement(names, jsize(index), env->NewStringUTF(active[index].c_str()));

@@ -72,8 +72,8 @@ LINES
 )
 
 # Misspelt names: the run writes its frames, with this many warnings, their key words among them.
-# The first three are one run's: of two renderers of one program, told once each, and never the
-# names a renderer binds by itself. The last run is right, a lost context and all: no warning.
+# The first three are one run's: three renderers, two of one program, each with the same three
+# misspelt names, told once per program, and never the names a renderer binds by itself. The last run is right, a lost context and all: no warning.
 printf '0 image wallpapr %s\n' "$picture" > misspelt.timeline
 printf '0.1 lose-context\n0.2 image wallpaper %s\n0.3 touch down 60 200\n' "$picture" > right.timeline
 while IFS='|' read -r count message args; do
@@ -84,9 +84,9 @@ while IFS='|' read -r count message args; do
   while read -r -d '^' part; do grep -qF -- "$part" stderr.txt || fail "no \"$part\""; done <<< "${message:+$message^}"
   rm -rf result
 done <<ROWS
-3|warning: the uniform 'uGlw' is not an active uniform of its program^did you mean 'uGlow'?^$(at "misspelt uniform" "")^the program's active uniforms: uGlow, uTime|$m/libvi_mistake_names.so
-3|warning: the attribute 'aPositon' is not an active attribute^did you mean 'aPosition'?^$(at "misspelt attribute" "")|$m/libvi_mistake_names.so
-3|warning: the sampler 'uPictur' is not an active sampler^did you mean 'uPicture'?^the program's active samplers: uPicture|$m/libvi_mistake_names.so
+6|warning: the uniform 'uGlw' is not an active uniform of its program^did you mean 'uGlow'?^$(at "misspelt uniform" "")^the program's active uniforms: uGlow, uTime|$m/libvi_mistake_names.so
+6|warning: the attribute 'aPositon' is not an active attribute^did you mean 'aPosition'?^$(at "misspelt attribute" "")|$m/libvi_mistake_names.so
+6|warning: the sampler 'uPictur' is not an active sampler^did you mean 'uPicture'?^the program's active samplers: uPicture|$m/libvi_mistake_names.so
 2|warning: the image 'wallpaperr' is handed in but the effect never asks for it; did you mean 'wallpaper'?^given by --image wallpaperr^warning: the effect asks for the image 'wallpaper' but none is handed in; did you mean 'wallpaperr'?|--image wallpaperr=$picture $plugin
 1|warning: the image 'wallpapr' is handed in but the effect never asks for it; did you mean 'wallpaper'?^given by misspelt.timeline:1|--image wallpaper=$picture --timeline misspelt.timeline $plugin
 0||--timeline right.timeline $plugin

@@ -2,8 +2,8 @@
 // time: MISTAKE_SHADER (a fragment shader that does not compile),
 // MISTAKE_LINK (a varying the vertex shader never writes), MISTAKE_ASSET or
 // MISTAKE_FILE (the name of an asset or a file to read), MISTAKE_NAMES (an
-// attribute, a uniform and a sampler misspelt, by two renderers of one
-// program, beside names a renderer binds by itself); or as it draws its
+// attribute, a uniform and a sampler misspelt, by three renderers, two of
+// them of one program, beside names a renderer binds by itself); or as it draws its
 // first frame: MISTAKE_NULL_WRITE (a write through a null member, in a
 // function of the standard library), MISTAKE_NULL_CALL (a call through one),
 // MISTAKE_RECURSION (one that does not end) or MISTAKE_ABORT. Without one it draws a colour, for as long as the host lets it.
@@ -11,6 +11,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <string>
 
 #include "Application/Scene.h"
 #include "Render/Renderer.h"
@@ -62,9 +63,10 @@ public:
 #elif defined(MISTAKE_FILE)
         vi::File(MISTAKE_FILE, false);
 #elif defined(MISTAKE_NAMES)
-        auto* program = new vi::ShaderProgram(kNamesVertex, kNamesFragment);
+        auto* first = new vi::ShaderProgram(kNamesVertex, kNamesFragment);
+        auto* second = new vi::ShaderProgram(kNamesVertex, std::string(kNamesFragment) + "// another program\n");
         auto* picture = new vi::Texture(mPixels, 1, 1, true, false, false, false, false, 4, false);
-        for (int renderer = 0; renderer < 2; ++renderer)
+        for (vi::ShaderProgram* program : {first, first, second})
             bindMisspelt(*new vi::Renderer(*program, *new vi::Drawable), *picture, mValues);
 #endif
     }

@@ -10,6 +10,7 @@ import java.nio.file.StandardCopyOption;
 import java.util.List;
 import java.util.concurrent.Callable;
 import java.util.concurrent.TimeUnit;
+import java.util.regex.Pattern;
 import java.util.stream.Stream;
 import javax.imageio.ImageIO;
 import org.junit.jupiter.api.Test;
@@ -100,7 +101,7 @@ class LiveWindowTest {
         live.outputWriter().append("keycode 67\n").flush();
         awaitText("key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
-        assertEquals(1, Files.readString(log).split(misspelt, -1).length - 1, "warned once");
+        assertEquals(1, Files.readString(log).split(Pattern.quote(misspelt), -1).length - 1, "warned once");
         run("xdotool", "key", "q");
         assertTrue(live.waitFor(20, TimeUnit.SECONDS), "q did not close the window");
         assertEquals(0, live.exitValue(), Files.readString(log));
