@@ -56,6 +56,13 @@ bool isSystemHeader(const char* place) {
     return std::strncmp(place, "/usr/include/", 13) == 0 || std::strncmp(place, "/usr/lib/", 9) == 0;
 }
 
+// The kit's code compiled into the plug-in (its helpers' library, the inline
+// code of its installed headers) is not the author's to change: the author's
+// own call into it is the place to name.
+bool isKitSource(const char* place) {
+    return std::strstr(place, "/helpers/Helpers/") || std::strstr(place, "/include/tarqvevyn/");
+}
+
 const char* baseName(const char* path) {
     const char* slash = std::strrchr(path, '/');
     return slash ? slash + 1 : path;
@@ -85,7 +92,7 @@ void dropCompilerNotes(char* function, char* place) {
 // addr2line's answer holds, for each address (a line "0x..."), pairs of
 // lines, function then file:line in it, from the innermost function inlined
 // there out to the frame's own. The place told is the first in the author's
-// own sources, with its function; the fault's own place when there is none.
+// own sources (neither a system header nor the kit's), with its function; the fault's own place when there is none.
 // Without debug information there is no place, and the symbol table may
 // still name the fault's function: false, with that name in `function`.
 bool describePlace(char* answer, char*& function, CrashPlace::Detail& detail) {
@@ -98,7 +105,7 @@ bool describePlace(char* answer, char*& function, CrashPlace::Detail& detail) {
         if (std::strncmp(lines[line], "0x", 2) == 0) {
             frame = line + 1;
         } else if (frame >= 0 && (line - frame) % 2 == 1 && !isUnknown(lines[line])) {
-            const bool own = !isSystemHeader(lines[line]);
+            const bool own = !isSystemHeader(lines[line]) && !isKitSource(lines[line]);
             if (!place || own) {
                 function = lines[line - 1];
                 place = lines[line];

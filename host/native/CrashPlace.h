@@ -1,6 +1,6 @@
 // Where a crash happened, in an author's terms: from the faulting frame out,
 // the first place on the stack in the effect's own sources (not a system
-// header), with its frame's function, read from the plug-in's debug
+// header, not the kit's helpers or headers), with its frame's function, read from the plug-in's debug
 // information by addr2line. Runs in the crash handler: fixed buffers only.
 #pragma once
 
