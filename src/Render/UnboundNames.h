@@ -3,9 +3,10 @@
 // Desktop only. The runtime drops a binding whose name the program does not
 // have, silently, as the phone needs; a desktop host may listen, so that it
 // can tell the author about a misspelt name. Heard once per add call that
-// found nothing, on the GL thread, while the program is current in its
-// context; never for the names a renderer binds by itself, never while a lost
-// context is repaired, never per frame. Not compiled for Android.
+// found nothing, on the GL thread (the program's name may belong to a lost
+// context not yet repaired); never for the names a renderer binds by itself,
+// never while a lost context is repaired, never per frame. Not compiled for
+// Android.
 
 #if !defined(__ANDROID__)
 

@@ -56,7 +56,9 @@ final class Misspellings {
             + "\n" + place);
         System.err.println(active.length == 0 ? "  the program has no active " + kind + "s"
             : "  the program's active " + kind + "s: " + String.join(", ", active));
-        if (near == null) System.err.println("  a name the shaders declare but never use is not active: the compiler removes it");
+        if (near == null) {
+            System.err.println("  a name the shaders declare but never use is not active: the compiler removes it");
+        }
     }
 
     private static void warn(String what, String... details) {
