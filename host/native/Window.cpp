@@ -7,6 +7,8 @@
 #include <SDL.h>
 #include <jni.h>
 
+#include <cstdint>
+#include <cstdlib>
 #include <string>
 
 #define WINDOW_NATIVE(method) Java_com_tarq_vi_player_Window_##method
@@ -23,6 +25,9 @@ enum EventKind {
     kKey = 5,  // event[1]: the SDL key code (ASCII for letters and digits)
     kExposed = 6,
 };
+
+// The x of a window placed by the window manager; the Java side has the same number.
+const jint kAnywhere = INT32_MIN;
 
 SDL_Window* gWindow = nullptr;
 SDL_GLContext gContext = nullptr;
@@ -55,9 +60,15 @@ void setViewport() {
 
 extern "C" {
 
-JNIEXPORT void JNICALL WINDOW_NATIVE(open)(JNIEnv* env, jclass, jstring title, jint width, jint height) {
+// At (x, y) on the screen, or where the window manager likes when x is kAnywhere.
+JNIEXPORT void JNICALL WINDOW_NATIVE(open)(JNIEnv* env, jclass, jstring title, jint x, jint y, jint width,
+                                           jint height) {
     // EGL on X11 too, so that the context is the kind the runtime checks with eglGetCurrentContext.
     SDL_SetHint(SDL_HINT_VIDEO_X11_FORCE_EGL, "1");
+    // The window's class is the tool's, not the JVM's ("java"): window managers group and name it by that,
+    // and a script finds it by that whichever process opened it.
+    SDL_SetHint(SDL_HINT_APP_NAME, "vi-live");
+    setenv("SDL_VIDEO_X11_WMCLASS", "vi-live", 0);
     if (SDL_Init(SDL_INIT_VIDEO) != 0) {
         fail(env, "no display to open a window on");
         return;
@@ -81,7 +92,9 @@ JNIEXPORT void JNICALL WINDOW_NATIVE(open)(JNIEnv* env, jclass, jstring title, j
     SDL_GL_SetAttribute(SDL_GL_STENCIL_SIZE, 8);
     SDL_GL_SetAttribute(SDL_GL_DOUBLEBUFFER, 1);
     const char* chars = env->GetStringUTFChars(title, nullptr);
-    gWindow = SDL_CreateWindow(chars, SDL_WINDOWPOS_UNDEFINED, SDL_WINDOWPOS_UNDEFINED, width, height,
+    const bool anywhere = x == kAnywhere;
+    gWindow = SDL_CreateWindow(chars, anywhere ? SDL_WINDOWPOS_UNDEFINED : x, anywhere ? SDL_WINDOWPOS_UNDEFINED : y,
+                               width, height,
                                SDL_WINDOW_OPENGL | SDL_WINDOW_SHOWN);
     env->ReleaseStringUTFChars(title, chars);
     if (!gWindow) {
@@ -111,6 +124,19 @@ JNIEXPORT void JNICALL WINDOW_NATIVE(size)(JNIEnv* env, jclass, jintArray size) 
     jint values[2] = {0, 0};
     SDL_GL_GetDrawableSize(gWindow, &values[0], &values[1]);
     env->SetIntArrayRegion(size, 0, 2, values);
+}
+
+// Where the window is on the screen: position[0] x, position[1] y.
+JNIEXPORT void JNICALL WINDOW_NATIVE(position)(JNIEnv* env, jclass, jintArray position) {
+    jint values[2] = {0, 0};
+    SDL_GetWindowPosition(gWindow, &values[0], &values[1]);
+    env->SetIntArrayRegion(position, 0, 2, values);
+}
+
+// A window with no effect in it: dark grey, so that it does not pass for a frame of the effect.
+JNIEXPORT void JNICALL WINDOW_NATIVE(clear)(JNIEnv*, jclass) {
+    glClearColor(0.12f, 0.12f, 0.12f, 1.0f);
+    glClear(GL_COLOR_BUFFER_BIT);
 }
 
 // As a phone does when it replaces its GL context: the old one is destroyed

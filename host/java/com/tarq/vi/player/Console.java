@@ -16,7 +16,11 @@ final class Console {
     private final ConcurrentLinkedQueue<String> lines = new ConcurrentLinkedQueue<>();
     private int number;
 
-    Console() {
+    private final Runnable onEnd;
+
+    /** onEnd runs on the reading thread once standard input has ended. */
+    Console(Runnable onEnd) {
+        this.onEnd = onEnd;
         Thread reader = new Thread(this::read, "vi-live console");
         reader.setDaemon(true);
         reader.start();
@@ -43,5 +47,6 @@ final class Console {
         } catch (IOException e) {
             // No console: the window's keys still work.
         }
+        onEnd.run();
     }
 }

@@ -5,8 +5,12 @@ import java.io.IOException;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.nio.file.StandardCopyOption;
+import java.time.Instant;
 import java.time.LocalTime;
+import java.time.ZoneId;
 import java.time.format.DateTimeFormatter;
+import java.time.temporal.ChronoUnit;
+import java.util.Locale;
 import java.util.Map;
 import java.util.Set;
 import javax.imageio.ImageIO;
@@ -17,7 +21,9 @@ import javax.imageio.ImageIO;
  * phone's host makes. A new build of the plug-in (or a change in its assets)
  * restarts the effect from a fresh copy, in the same window. Started by the
  * vi-live launcher, which names the libraries and preloads the clock library
- * (the host keeps the effect's clock, so that a pause stops it).
+ * (the host keeps the effect's clock, so that a pause stops it). The process
+ * the launcher starts supervises (LiveSupervisor); the window runs in its
+ * child, and in the next one should an effect end that process.
  */
 public final class Live implements Session.Surface {
     static final String USAGE = String.join("\n",
@@ -38,8 +44,17 @@ public final class Live implements Session.Surface {
 
     private static final long FRAME_NANOS = 1_000_000_000L / 60;
     private static final DateTimeFormatter CLOCK = DateTimeFormatter.ofPattern("HH:mm:ss");
+    /** How long a window process that has lost its supervisor gives its render thread to end. */
+    private static final long ORPHAN_MILLIS = 2000;
+    /** How long a window that replaces one waits for the display to take it. */
+    private static final long DISPLAY_BACK_NANOS = 3_000_000_000L;
 
     private final Options options;
+    /** The folder shared with the supervising process: the state, and the plug-in's copies. */
+    private final Path folder;
+    /** The wall clock's nanoseconds less the monotonic clock's, read before the effect's clock is set. */
+    private final long wallClockOffset = ChronoUnit.NANOS.between(Instant.EPOCH, Instant.now()) - System.nanoTime();
+    private LiveState state;
     private final Session session;
     private final Native host;
     private final FrameTimes frameTimes = new FrameTimes();
@@ -47,8 +62,11 @@ public final class Live implements Session.Surface {
     private final String name;
     private PluginWatch watch;
     private AssetModels models;
-    /** The copy of the plug-in the effect runs from. */
+    /** The copy of the plug-in the effect runs from; null while no effect runs. */
     private Path running;
+    /** When the build last started was written, on the wall clock; 0 once its first frame is told. */
+    private long reloadWrittenNanos;
+    private final boolean benchReloads = System.getenv("VI_BENCH_RELOADS") != null;
     private String lastReload = "started";
     /** The effect's clock, from the start; stands still while paused. */
     private long effectNanos;
@@ -56,23 +74,27 @@ public final class Live implements Session.Surface {
     private boolean step;
     private boolean redraw;
     private boolean screenshot;
-    private boolean quit;
+    private volatile boolean quit;
+    private volatile boolean supervisorLost;
 
-    private Live(Options options) {
+    private Live(Options options, Path folder) {
         this.options = options;
+        this.folder = folder;
         session = new Session("vi-live", options.width, options.height);
         host = session.host;
         name = options.plugin.getFileName().toString();
     }
 
     public static void main(String[] args) {
+        String folder = System.getenv(LiveSupervisor.FOLDER_VARIABLE);
         int status;
         try {
+            if (folder == null) System.exit(LiveSupervisor.run());
             Options options = Options.parse(args, OPTIONS);
             if (options.help) {
                 System.out.print(USAGE + "\n" + LiveKeys.table());
             } else {
-                new Live(options).run();
+                new Live(options, Path.of(folder)).run();
             }
             status = 0;
         } catch (Options.UsageException e) {
@@ -89,9 +111,19 @@ public final class Live implements Session.Surface {
     private void run() throws Failure, IOException {
         Path plugin = options.plugin.toAbsolutePath();
         if (!Files.isRegularFile(plugin)) throw new Failure("plug-in not found: " + options.plugin);
-        for (Map.Entry<String, Path> image : options.images.entrySet()) {
-            session.addImage(image.getKey(), image.getValue(), "--image " + image.getKey());
+        state = LiveState.read(folder);
+        boolean resumed = state != null;
+        if (!resumed) {
+            state = new LiveState();
+            for (Map.Entry<String, Path> image : options.images.entrySet()) {
+                state.images.put(image.getKey(), image.getValue().toAbsolutePath());
+            }
         }
+        for (Map.Entry<String, Path> image : state.images.entrySet()) {
+            String name = image.getKey();
+            session.addImage(name, image.getValue(), options.images.containsKey(name) ? "--image " + name : "stdin");
+        }
+        Misspellings.warnedBefore(state.warnedImages);
         Path assets = Session.assetDirectory(plugin, options.assets);
         Session.loadLibraries("vi-live", "vi.window");
         Desktop.explainFatalExits("vi-live");
@@ -99,38 +131,117 @@ public final class Live implements Session.Surface {
         if (!Desktop.setClock(Player.FIXED_CLOCK_START)) {
             throw new Failure("the clock library is not preloaded; start it with vi-live");
         }
-        openWindow();
+        session.turn(state.orientation);
+        openWindow(resumed);
         try {
             if (assets != null) Desktop.setAssetDirectory(assets.toString());
             models = new AssetModels("vi-live", assets);
             models.check();
-            watch = new PluginWatch(plugin, assets);
-            running = watch.copy();
-            try {
-                if (!session.start(running.toString())) {
-                    String reason = Desktop.whyNotLoadable(running.toString());
-                    throw new Failure("cannot start the effect in " + options.plugin + ": "
-                        + (reason != null ? reason : "the runtime refused it"));
-                }
-            } finally {
-                PluginWatch.discard(running);
+            watch = new PluginWatch(plugin, assets, folder, resumed ? state.build : null);
+            if (resumed) {
+                lastReload = "ended " + wallClock() + ": " + state.ended + " | waiting for the next build";
+                redraw = true;
+                System.err.println("vi-live: the window waits for the next build of " + options.plugin);
+            } else {
+                startFirst();
             }
-            System.out.printf("vi-live: playing %s in a %dx%d window; h for the keys%n", options.plugin,
-                session.width(), session.height());
-            System.out.flush();
             loop();
-            host.prehandleStop();
+            if (running != null) host.prehandleStop();
         } finally {
             Window.close();
+            if (supervisorLost) LiveSupervisor.removeFolder(folder);
         }
         frameTimes.reportForBench();
     }
 
-    private void openWindow() throws Failure {
+    private void startFirst() throws Failure, IOException {
+        Path copy = watch.copy();
         try {
-            Window.open("vi-live: " + name, session.width(), session.height());
-        } catch (IllegalStateException e) {
-            throw new Failure(e.getMessage() + "; without a display, run it under xvfb-run (xvfb-run -a scripts/live)");
+            if (!start(copy)) {
+                String reason = Desktop.whyNotLoadable(copy.toString());
+                throw new Failure("cannot start the effect in " + options.plugin + ": "
+                    + (reason != null ? reason : "the runtime refused it"));
+            }
+        } finally {
+            PluginWatch.discard(copy);
+        }
+        System.out.printf("vi-live: playing %s in a %dx%d window; h for the keys%n", options.plugin,
+            session.width(), session.height());
+        System.out.flush();
+    }
+
+    /**
+     * Starts the effect from a copy, the state written first: should the
+     * effect end this process, the next window opens as this one is now.
+     */
+    private boolean start(Path copy) {
+        state.build = watch.loaded();
+        state.effectPid = ProcessHandle.current().pid();
+        saveState();
+        if (!session.start(copy.toString())) return false;
+        running = copy;
+        return true;
+    }
+
+    /** The window's state as it is now, for the next window process. */
+    private void saveState() {
+        int[] position = new int[2];
+        Window.position(position);
+        state.x = position[0];
+        state.y = position[1];
+        state.orientation = session.orientation();
+        state.warnedImages.addAll(Misspellings.warnedImages());
+        try {
+            state.write(folder);
+        } catch (IOException e) {
+            System.err.println("vi-live: cannot keep the window's state in " + folder + ": " + e.getMessage());
+        }
+    }
+
+    /**
+     * Standard input has ended: the supervising process is gone, and so is this
+     * one, its folder removed by the render thread once it stops writing there.
+     */
+    private void loseSupervisor() {
+        supervisorLost = true;
+        quit = true;
+        try {
+            Thread.sleep(ORPHAN_MILLIS);
+        } catch (InterruptedException e) {
+            Thread.currentThread().interrupt();
+        }
+        // Still here: the render thread is held in the effect.
+        LiveSupervisor.removeFolder(folder);
+        Runtime.getRuntime().halt(1);
+    }
+
+    private String wallClock() {
+        return LocalTime.ofInstant(Instant.EPOCH.plusNanos(wallClockOffset + System.nanoTime()), ZoneId.systemDefault())
+            .format(CLOCK);
+    }
+
+    /**
+     * The window, where the last one was. A window that replaces one tries for
+     * a while: a virtual display regenerates when its last client has gone,
+     * and refuses a new one meanwhile.
+     */
+    private void openWindow(boolean replacing) throws Failure {
+        long end = System.nanoTime() + (replacing ? DISPLAY_BACK_NANOS : 0);
+        for (;;) {
+            try {
+                Window.open("vi-live: " + name, state.x, state.y, session.width(), session.height());
+                return;
+            } catch (IllegalStateException e) {
+                if (System.nanoTime() >= end) {
+                    throw new Failure(e.getMessage()
+                        + "; without a display, run it under xvfb-run (xvfb-run -a scripts/live)");
+                }
+            }
+            try {
+                Thread.sleep(50);
+            } catch (InterruptedException e) {
+                Thread.currentThread().interrupt();
+            }
         }
     }
 
@@ -138,7 +249,7 @@ public final class Live implements Session.Surface {
     private void loop() throws IOException {
         String benchFrames = System.getenv("VI_BENCH_FRAMES");
         int frames = benchFrames == null ? -1 : Integer.parseInt(benchFrames);
-        Console console = new Console();
+        Console console = new Console(this::loseSupervisor);
         long last = System.nanoTime();
         long next = last;
         long titled = 0;
@@ -150,21 +261,19 @@ public final class Live implements Session.Surface {
             for (int kind = Window.nextEvent(event); kind != Window.NONE; kind = Window.nextEvent(event)) {
                 windowEvent(kind);
             }
-            for (Timeline.Event typed = console.next(); typed != null; typed = console.next()) {
-                if (typed.kind().equals("end")) quit = true;
-                try {
-                    session.apply(typed, this, Path.of(""));
-                } catch (IOException e) {
-                    System.err.println("vi-live: stdin: " + e.getMessage());
-                }
-            }
+            for (Timeline.Event typed = console.next(); typed != null; typed = console.next()) typed(typed);
             if (watch.changedAndSettled(now)) reload();
             if (step) effectNanos += FRAME_NANOS;
             Desktop.setClock(Player.FIXED_CLOCK_START + effectNanos);
-            if (!paused || step || redraw || screenshot) frame();
+            if (running == null) {
+                showNothing();
+            } else if (!paused || step || redraw || screenshot) {
+                frame();
+            }
             if (now - titled >= 1_000_000_000L) {
                 titled = now;
                 Window.setTitle(title());
+                saveState();
             }
             if (frames >= 0) {
                 quit |= frameTimes.count() >= frames;
@@ -181,9 +290,46 @@ public final class Live implements Session.Surface {
         Window.swap();
         frameTimes.add(System.nanoTime() - started);
         step = redraw = screenshot = false;
+        if (!state.shown) {
+            state.shown = true;
+            saveState();
+        }
+        if (reloadWrittenNanos != 0 && benchReloads) {
+            System.out.printf(Locale.ROOT, "reload-ms %.1f%n", (wallClockOffset + System.nanoTime()
+                - reloadWrittenNanos) / 1e6);
+            System.out.flush();
+        }
+        reloadWrittenNanos = 0;
+    }
+
+    /** No effect runs: the window is drawn dark when it needs drawing, and a screenshot shows that. */
+    private void showNothing() throws IOException {
+        if (!redraw && !screenshot) return;
+        Window.clear();
+        if (screenshot) saveScreenshot();
+        Window.swap();
+        redraw = screenshot = false;
+    }
+
+    /** A host event typed on standard input; an image is handed in again at each start. */
+    private void typed(Timeline.Event typed) {
+        if (typed.kind().equals("end")) quit = true;
+        try {
+            if (typed.kind().equals("image")) {
+                String name = typed.arguments().get(0);
+                Path file = Session.imagePath(typed, Path.of("")).toAbsolutePath();
+                session.addImage(name, file, "stdin");
+                state.images.remove(name);
+                state.images.put(name, file);
+            }
+            if (running != null) session.apply(typed, this, Path.of(""));
+        } catch (IOException e) {
+            System.err.println("vi-live: stdin: " + e.getMessage());
+        }
     }
 
     private void windowEvent(int kind) throws IOException {
+        if (running == null && kind != Window.QUIT && kind != Window.KEY && kind != Window.EXPOSED) return;
         switch (kind) {
             case Window.QUIT -> quit = true;
             case Window.TOUCH_DOWN -> host.prehandleTouch(event[1], event[2], 0);
@@ -197,6 +343,11 @@ public final class Live implements Session.Surface {
 
     private void key(LiveKeys key) throws IOException {
         if (key == null) return;
+        if (running == null && key != LiveKeys.QUIT && key != LiveKeys.HELP && key != LiveKeys.SCREENSHOT
+            && key != LiveKeys.RELOAD) {
+            System.err.println("vi-live: no effect runs; the window waits for the next build");
+            return;
+        }
         switch (key) {
             case AFFORDANCE -> host.prehandleAffordance();
             case UNLOCK -> host.prehandleUnlock();
@@ -219,7 +370,7 @@ public final class Live implements Session.Surface {
     /**
      * Checks the plug-in as it is now, then restarts the effect from a fresh
      * copy with the same window, orientation and images; a build that does
-     * not load leaves the running effect.
+     * not load leaves the running effect, or the window waiting.
      */
     private void reload() {
         watch.markLoaded();
@@ -233,22 +384,23 @@ public final class Live implements Session.Surface {
             copy = null;
             reason = "cannot copy it: " + e.getMessage();
         }
-        boolean started = copy != null && reason == null && session.start(copy.toString());
+        Path before = running;
+        reloadWrittenNanos = watch.written();
+        boolean started = copy != null && reason == null && start(copy);
         if (copy != null) PluginWatch.discard(copy);
         if (started) {
-            running = copy;
-            lastReload = "reloaded " + LocalTime.now().format(CLOCK);
+            lastReload = "reloaded " + wallClock();
             System.out.println("vi-live: reloaded " + options.plugin);
             System.out.flush();
         } else {
             if (reason == null) {
-                // The running copy is gone from the disk, but the loader still holds it under its path.
                 reason = "the runtime refused it";
-                session.start(running.toString());
+                // The running copy is gone from the disk, but the loader still holds it under its path.
+                if (before != null) session.start(before.toString());
             }
-            lastReload = "reload failed " + LocalTime.now().format(CLOCK) + ": " + reason;
-            System.err.println("vi-live: the new build of " + options.plugin + " does not load, the running effect"
-                + " stays: " + reason);
+            lastReload = "reload failed " + wallClock() + ": " + reason;
+            System.err.println("vi-live: the new build of " + options.plugin + " does not load, "
+                + (before != null ? "the running effect stays: " : "the window waits for the next: ") + reason);
         }
         Window.setTitle(title());
     }

@@ -25,6 +25,16 @@ final class Misspellings {
         Desktop.tellUnboundNames();
     }
 
+    /** The image names warned about so far. */
+    static Set<String> warnedImages() {
+        return Set.copyOf(warnedImages);
+    }
+
+    /** Image names warned about already, by the process before: not warned about again. */
+    static void warnedBefore(Collection<String> names) {
+        warnedImages.addAll(names);
+    }
+
     /**
      * The images the effect asks for against those handed in (each name with
      * where it was given: "--image NAME" or "FILE:LINE" of a timeline).

@@ -4,6 +4,8 @@ import java.io.IOException;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.nio.file.attribute.BasicFileAttributes;
+import java.time.Instant;
+import java.time.temporal.ChronoUnit;
 import java.util.Objects;
 import java.util.stream.Stream;
 
@@ -11,9 +13,9 @@ import java.util.stream.Stream;
  * Watches the plug-in file and its asset folder for a new build, and copies
  * the plug-in to a fresh path for each load: the runtime never opens a path
  * it has loaded again, and a build must not rewrite the library the effect
- * runs from. Each copy lives in a private folder of its own only until the
- * runtime has opened it (discard()): a mapped library needs no file, and so
- * not even a killed window leaves copies behind.
+ * runs from. Each copy lives in a folder of its own, inside the window's
+ * folder, only until the runtime has opened it (discard()): a mapped library
+ * needs no file.
  */
 final class PluginWatch {
     /** A change counts once the files have stayed as they are this long. */
@@ -22,17 +24,34 @@ final class PluginWatch {
 
     private final Path plugin;
     private final Path assets;
+    private final Path folder;
     private int copied;
     private String loaded;
     private String seen;
     private long seenSince;
     private long lastLook;
 
-    PluginWatch(Path plugin, Path assets) {
+    /** Copies go into folder; `loaded` is the files as last loaded, null for as they are now. */
+    PluginWatch(Path plugin, Path assets, Path folder, String loaded) {
         this.plugin = plugin;
         this.assets = assets;
-        loaded = signature();
-        seen = loaded;
+        this.folder = folder;
+        this.loaded = loaded != null ? loaded : signature();
+        seen = this.loaded;
+    }
+
+    /** The files as last loaded (or found at the start), to compare a later look with. */
+    String loaded() {
+        return loaded;
+    }
+
+    /** When the plug-in was last written, in nanoseconds of the wall clock; 0 when it is not there. */
+    long written() {
+        try {
+            return ChronoUnit.NANOS.between(Instant.EPOCH, Files.getLastModifiedTime(plugin).toInstant());
+        } catch (IOException e) {
+            return 0;
+        }
     }
 
     /**
@@ -40,8 +59,7 @@ final class PluginWatch {
      * by the exit handler too, should the effect end the process while starting.
      */
     Path copy() throws IOException {
-        String folder = "vi-live-" + ProcessHandle.current().pid() + "-";
-        Path copy = Files.createTempDirectory(folder).resolve(++copied + "-" + plugin.getFileName());
+        Path copy = Files.createTempDirectory(folder, "copy-").resolve(++copied + "-" + plugin.getFileName());
         Desktop.removeOnFatalExit(copy.getParent().toString());
         try {
             Files.copy(plugin, copy);

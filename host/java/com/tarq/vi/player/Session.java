@@ -144,6 +144,16 @@ final class Session {
      * is initialised anew for it.
      */
     void rotate(int orientation, Surface surface) {
+        if (turn(orientation)) {
+            surface.resize(width, height);
+            Desktop.setWindowRectangle(0, 0, width, height);
+        }
+        host.prehandleSetOrientation(orientation);
+        host.prehandleInitEffect();
+    }
+
+    /** The orientation and the shape it gives, before any surface or effect; true when the shape changed. */
+    boolean turn(int orientation) {
         this.orientation = orientation;
         boolean portraitStart = startWidth <= startHeight;
         boolean portrait = orientation == 0 ? portraitStart : !portraitStart;
@@ -151,14 +161,10 @@ final class Session {
         int shorter = Math.min(startWidth, startHeight);
         int w = portrait ? shorter : longer;
         int h = portrait ? longer : shorter;
-        if (w != width || h != height) {
-            width = w;
-            height = h;
-            surface.resize(width, height);
-            Desktop.setWindowRectangle(0, 0, width, height);
-        }
-        host.prehandleSetOrientation(orientation);
-        host.prehandleInitEffect();
+        boolean changed = w != width || h != height;
+        width = w;
+        height = h;
+        return changed;
     }
 
     /**

@@ -19,8 +19,14 @@ final class Window {
     /** The window's pixels were lost and must be drawn again. */
     static final int EXPOSED = 6;
 
-    /** Opens the window with a GL ES 2 context current; IllegalStateException with SDL's reason when it cannot. */
-    static native void open(String title, int width, int height);
+    /** The x of a window the window manager places. */
+    static final int ANYWHERE = Integer.MIN_VALUE;
+
+    /**
+     * Opens the window at (x, y) with a GL ES 2 context current; IllegalStateException
+     * with SDL's reason when it cannot.
+     */
+    static native void open(String title, int x, int y, int width, int height);
 
     static native void close();
 
@@ -28,6 +34,12 @@ final class Window {
 
     /** The drawable's size: size[0] width, size[1] height. */
     static native void size(int[] size);
+
+    /** Where the window is on the screen: position[0] x, position[1] y. */
+    static native void position(int[] position);
+
+    /** Fills the window with a dark grey, for a window without an effect; swap() shows it. */
+    static native void clear();
 
     /** Destroys the GL context and makes a new one current, as a phone does when it replaces it. */
     static native void loseContext();

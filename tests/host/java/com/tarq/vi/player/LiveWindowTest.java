@@ -19,11 +19,14 @@ import org.junit.jupiter.api.Test;
  * The live window on a virtual display (run under xvfb-run), driven by real
  * input through XTest (xdotool) and read back through its own screenshot key,
  * in one session as an author keeps it open: the test effect paints white
- * where the finger goes over its colour, and is rebuilt while the window runs.
- * Before it, the ways the window ends at once: no display, a bad option, a crash.
+ * where the finger goes over its colour, and is rebuilt while the window runs,
+ * also with builds that end its process. The window is found by its class,
+ * whichever process has opened it. Before it, the ways the window ends at once:
+ * no display, a bad option, a crash; after it, the ways it is ended from outside.
  */
 class LiveWindowTest {
-    private static final int BLUE = 0x2050E0, ORANGE = 0xF08020, WHITE = 0xFFFFFF;
+    private static final int BLUE = 0x2050E0, ORANGE = 0xF08020, WHITE = 0xFFFFFF, GREEN = 0x00FF00;
+    private static final String[] FIND_WINDOW = {"xdotool", "search", "--classname", "^vi-live$"};
     private Path scratch, plugin, log;  // log: the window's output and errors
     private Process live;
     private int shots;
@@ -52,8 +55,7 @@ class LiveWindowTest {
         String misspelt = "vi-live: warning: the image 'wallpapr' is handed in but the effect never asks for it;"
             + " did you mean 'wallpaper'?";
         assertTrue(Files.readString(log).contains(misspelt), Files.readString(log));
-        String window = poll(() -> run("xdotool", "search", "--pid", "" + live.pid()).lines().findFirst()
-            .filter(id -> !id.startsWith("status")).orElse(null));
+        String window = findWindow();
         run("xdotool", "mousemove", "--window", window, "90", "300");
         BufferedImage before = shot();
         assertEquals(BLUE, before.getRGB(90, 160) & WHITE, "the effect's colour");
@@ -86,11 +88,9 @@ class LiveWindowTest {
         // that do not load leave it running and say why.
         rebuild(Path.of(System.getProperty("vi.orange")), "vi-live: reloaded");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
-        assertEquals(window + "\nstatus 0", run("xdotool", "search", "--pid", "" + live.pid()), "the same window");
-        try (Stream<Path> temporary = Files.list(Path.of(System.getProperty("java.io.tmpdir")))) {
-            String copies = "vi-live-" + live.pid() + "-";  // the running effect's copy is gone once loaded
-            assertEquals(List.of(), temporary.filter(p -> p.getFileName().toString().startsWith(copies)).toList());
-        }
+        assertEquals(window + "\nstatus 0", run(FIND_WINDOW), "the same window");
+        assertEquals(List.of(1, 2), leftBehind(live).stream().map(Path::getNameCount).toList(),
+            "the running effect's copy is gone once loaded: only its folder and the window's state");
         rebuild(Path.of(System.getProperty("vi.nofactory")),
             "the running effect stays: the library has no \"createScene\"");
         rebuild(Files.writeString(scratch.resolve("garbage.so"), "x".repeat(4096)), "invalid ELF header");
@@ -101,10 +101,74 @@ class LiveWindowTest {
         live.outputWriter().append("keycode 67\n").flush();
         awaitText("key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
+
+        // Builds that end the process, by the runtime's exit and by a crash: the window is back where it was,
+        // turned as it was, says why in its title, and waits; the good build again brings the effect back,
+        // with the image typed in.
+        live.outputWriter().append("image wallpaper " + System.getProperty("vi.picture") + "\n").flush();
+        poll(() -> (shot().getRGB(4, 316) & WHITE) == GREEN ? "" : null);
+        run("xdotool", "windowmove", window, "130", "70");
+        run("xdotool", "key", "o");
+        String placed = poll(() -> geometry().contains("Position: 130,70") ? geometry() : null);
+        assertTrue(placed.contains("Geometry: 320x180"), placed);
+        rebuild(Path.of(System.getProperty("vi.shader")), "vi-live: error: the fragment shader does not compile");
+        poll(() -> run("xdotool", "getwindowname", findWindow()).contains("waiting") ? "" : null);
+        assertEquals(placed, geometry(), "the window back in its place");
+        assertTrue(run("xdotool", "getwindowname", findWindow()).contains("fragment shader does not compile"));
+        rebuild(Path.of(System.getProperty("vi.nullwrite")), "vi-live: error: the effect crashed: SIGSEGV");
+        poll(() -> run("xdotool", "getwindowname", findWindow()).contains("crashed: SIGSEGV") ? "" : null);
+        Files.copy(Path.of(System.getProperty("vi.blue")), plugin, StandardCopyOption.REPLACE_EXISTING);
+        poll(() -> Files.readString(log).split("vi-live: reloaded", -1).length == 4 ? "" : null);  // orange, crash, blue
+        BufferedImage back = shot();
+        assertEquals(List.of(320, 180, BLUE, GREEN), List.of(back.getWidth(), back.getHeight(),
+            back.getRGB(300, 170) & WHITE, back.getRGB(4, 176) & WHITE), "the effect back, turned, with its image");
+        assertEquals(placed, geometry());
+
         assertEquals(1, Files.readString(log).split(Pattern.quote(misspelt), -1).length - 1, "warned once");
         run("xdotool", "key", "q");
         assertTrue(live.waitFor(20, TimeUnit.SECONDS), "q did not close the window");
         assertEquals(0, live.exitValue(), Files.readString(log));
+        assertEquals(List.of(), leftBehind(live));
+    }
+
+    /** However the window is ended from outside, neither its process nor its files stay. */
+    @Test
+    void endedFromOutsideLeavesNothing() throws Exception {
+        scratch = Files.createTempDirectory(Files.createDirectories(Path.of(System.getProperty("vi.scratch"))), "end-");
+        log = scratch.resolve("log.txt");
+        for (String signal : List.of("TERM", "KILL")) {
+            live = new ProcessBuilder(System.getProperty("vi.live"), System.getProperty("vi.blue"))
+                .redirectOutput(log.toFile()).redirectErrorStream(true).start();
+            awaitText("vi-live: playing");
+            List<ProcessHandle> window = live.descendants().toList();
+            assertFalse(window.isEmpty());
+            run("kill", "-" + signal, "" + live.pid());
+            live.waitFor();
+            for (long end = System.currentTimeMillis() + 20_000; window.stream().anyMatch(ProcessHandle::isAlive);
+                Thread.sleep(20)) {
+                assertTrue(System.currentTimeMillis() < end, "the window process outlives SIG" + signal);
+            }
+            assertEquals(List.of(), leftBehind(live), "SIG" + signal);
+            assertTrue(run(FIND_WINDOW).endsWith("status 1"), "SIG" + signal);
+        }
+    }
+
+    /** The window's folders in the temporary folder, and what they hold. */
+    private static List<Path> leftBehind(Process live) throws Exception {
+        Path temporary = Path.of(System.getProperty("java.io.tmpdir"));
+        try (Stream<Path> paths = Files.walk(temporary, 2)) {
+            String folder = "vi-live-" + live.pid() + "-";
+            return paths.map(temporary::relativize).filter(p -> p.getName(0).toString().startsWith(folder)).toList();
+        }
+    }
+
+    private String findWindow() throws Exception {
+        return poll(() -> run(FIND_WINDOW).lines().findFirst().filter(id -> !id.startsWith("status")).orElse(null));
+    }
+
+    /** Where the window is and its size, whichever window it is. */
+    private String geometry() throws Exception {
+        return run("xdotool", "getwindowgeometry", findWindow()).replaceFirst("Window \\d+", "");
     }
 
     /** A new build lands as a linker writes it, the file rewritten in place; the window tells what it made of it. */

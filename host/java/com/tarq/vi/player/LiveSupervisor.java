@@ -1,0 +1,164 @@
+package com.tarq.vi.player;
+
+import static java.nio.charset.StandardCharsets.UTF_8;
+
+import java.io.BufferedReader;
+import java.io.IOException;
+import java.io.OutputStream;
+import java.nio.file.Files;
+import java.nio.file.Path;
+import java.util.ArrayList;
+import java.util.Comparator;
+import java.util.List;
+import java.util.Set;
+import java.util.concurrent.TimeUnit;
+import java.util.stream.Stream;
+
+/**
+ * The process vi-live starts as. It owns the command line, the terminal and a
+ * private folder, and runs the window in a child process of the same command:
+ * after an effect has ended its own process (the runtime's fatal exit, a
+ * crash), neither the runtime's lock nor its state can be trusted, so only a
+ * new process can go on. When that happens once the window has shown a frame,
+ * the next window process opens at the same place, turned the same way with
+ * the same images, says why in its title, and waits for the next build;
+ * otherwise the child's status is the status. Standard input is relayed to the
+ * child as typed; the child takes the end of its standard input for a lost
+ * supervisor and ends too. On SIGINT, SIGTERM or SIGHUP the child is ended and
+ * the folder removed.
+ */
+final class LiveSupervisor {
+    /** Set in a window process's environment: the folder it shares with its supervisor. */
+    static final String FOLDER_VARIABLE = "VI_LIVE_FOLDER";
+    /** The runtime's exits on an author's mistake, and the crash handler's 128 + SIGILL, SIGABRT, SIGBUS, SIGFPE, SIGSEGV. */
+    private static final Set<Integer> EFFECT_ENDINGS = Set.of(88, 67, 71, 45, 132, 134, 135, 136, 139);
+    private static final String ERROR = "vi-live: error: ";
+    /** How long a child has to end on SIGTERM before it is killed. */
+    private static final long STOP_SECONDS = 3;
+
+    private final Path folder;
+    private final List<String> command;
+    private Process child;
+    private boolean stopping;
+    private volatile String lastError;
+
+    private LiveSupervisor(Path folder, List<String> command) {
+        this.folder = folder;
+        this.command = command;
+    }
+
+    /** Runs window processes until one ends for good; its status. */
+    static int run() throws IOException, Failure {
+        ProcessHandle.Info self = ProcessHandle.current().info();
+        if (self.command().isEmpty() || self.arguments().isEmpty()) {
+            throw new Failure("cannot read its own command line to start the window with");
+        }
+        List<String> command = new ArrayList<>();
+        command.add(self.command().get());
+        command.addAll(List.of(self.arguments().get()));
+        Path folder = Files.createTempDirectory("vi-live-" + ProcessHandle.current().pid() + "-");
+        LiveSupervisor supervisor = new LiveSupervisor(folder, command);
+        Runtime.getRuntime().addShutdownHook(new Thread(supervisor::stop, "vi-live stop"));
+        try {
+            return supervisor.supervise();
+        } catch (InterruptedException e) {
+            Thread.currentThread().interrupt();
+            return 1;
+        }
+    }
+
+    private int supervise() throws IOException, InterruptedException {
+        Thread input = new Thread(this::relayInput, "vi-live input");
+        input.setDaemon(true);
+        for (;;) {
+            Process process = start();
+            if (process == null) return 1;
+            if (input.getState() == Thread.State.NEW) input.start();
+            Thread errors = new Thread(() -> relayErrors(process), "vi-live errors");
+            errors.start();
+            int status = process.waitFor();
+            errors.join();
+            LiveState state = LiveState.read(folder);
+            synchronized (this) {
+                if (stopping) return status;
+            }
+            boolean effectEnded = EFFECT_ENDINGS.contains(status) && state != null && state.effectPid == process.pid();
+            // A build that ends the process before the window has shown anything is not
+            // waited out: the author sees the message and the status, as without a window.
+            if (!effectEnded || !state.shown) return status;
+            state.ended = lastError != null ? lastError : "the effect ended its process with status " + status;
+            lastError = null;
+            state.write(folder);
+        }
+    }
+
+    /** The next window process, or null once stopping. */
+    private synchronized Process start() throws IOException {
+        if (stopping) return null;
+        ProcessBuilder builder = new ProcessBuilder(command).redirectOutput(ProcessBuilder.Redirect.INHERIT);
+        builder.environment().put(FOLDER_VARIABLE, folder.toString());
+        child = builder.start();
+        return child;
+    }
+
+    /** Standard input to whichever window process runs; what is typed while one replaces another is lost. */
+    private void relayInput() {
+        byte[] buffer = new byte[4096];
+        try {
+            for (int count = System.in.read(buffer); count > 0; count = System.in.read(buffer)) {
+                OutputStream to;
+                synchronized (this) {
+                    to = child.getOutputStream();
+                }
+                try {
+                    to.write(buffer, 0, count);
+                    to.flush();
+                } catch (IOException e) {
+                    // That process has ended; the next one starts without it.
+                }
+            }
+        } catch (IOException e) {
+            // No console: the window's keys still work.
+        }
+        // The child's standard input stays open: its end would tell the child this process is gone.
+    }
+
+    /** The child's standard error, line by line, keeping the last error's words for the next window's title. */
+    private void relayErrors(Process process) {
+        try (BufferedReader reader = process.errorReader(UTF_8)) {
+            for (String line = reader.readLine(); line != null; line = reader.readLine()) {
+                if (line.startsWith(ERROR)) lastError = line.substring(ERROR.length());
+                System.err.println(line);
+            }
+        } catch (IOException e) {
+            // The child has gone; what it said is said.
+        }
+    }
+
+    /** On every exit of this process: the window process ended (on SIGTERM, then SIGKILL), the folder removed. */
+    private void stop() {
+        Process process;
+        synchronized (this) {
+            stopping = true;
+            process = child;
+        }
+        try {
+            if (process != null && process.isAlive()) {
+                process.destroy();
+                if (!process.waitFor(STOP_SECONDS, TimeUnit.SECONDS)) process.destroyForcibly().waitFor();
+            }
+        } catch (InterruptedException e) {
+            Thread.currentThread().interrupt();
+        }
+        removeFolder(folder);
+    }
+
+    /** Removes a folder and everything in it; what cannot be removed is left, said on standard error. */
+    static void removeFolder(Path folder) {
+        try (Stream<Path> paths = Files.walk(folder)) {
+            for (Path path : paths.sorted(Comparator.reverseOrder()).toList()) Files.deleteIfExists(path);
+        } catch (IOException e) {
+            if (Files.exists(folder)) System.err.println("vi-live: cannot remove " + folder + ": " + e.getMessage());
+        }
+    }
+}
