@@ -406,7 +406,8 @@ public final class Live implements Session.Surface {
     }
 
     private String title() {
-        return "vi-live: " + name + " | " + frameTimes.summary() + (paused ? " | paused" : "") + " | " + lastReload
+        String frames = running == null ? "" : frameTimes.summary() + (paused ? " | paused" : "") + " | ";
+        return "vi-live: " + name + " | " + frames + lastReload
             + " | " + LiveKeys.line();
     }
 
