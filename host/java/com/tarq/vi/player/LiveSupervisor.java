@@ -33,6 +33,10 @@ final class LiveSupervisor {
     /** The runtime's exits on an author's mistake, and the crash handler's 128 + SIGILL, SIGABRT, SIGBUS, SIGFPE, SIGSEGV. */
     private static final Set<Integer> EFFECT_ENDINGS = Set.of(88, 67, 71, 45, 132, 134, 135, 136, 139);
     private static final String ERROR = "vi-live: error: ";
+    /** A status above this is 128 + the signal that ended the process. */
+    private static final int SIGNALLED = 128;
+    /** 128 + SIGHUP, SIGINT, SIGTERM: a child asked to end (a Ctrl-C reaches it too) is no surprise to report. */
+    private static final Set<Integer> ASKED_TO_END = Set.of(129, 130, 143);
     /** How long a child has to end on SIGTERM before it is killed. */
     private static final long STOP_SECONDS = 3;
 
@@ -85,7 +89,12 @@ final class LiveSupervisor {
             boolean effectEnded = EFFECT_ENDINGS.contains(status) && state != null && state.effectPid == process.pid();
             // A build that ends the process before the window has shown anything is not
             // waited out: the author sees the message and the status, as without a window.
-            if (!effectEnded || !state.shown) return status;
+            if (!effectEnded || !state.shown) {
+                if (status > SIGNALLED && !ASKED_TO_END.contains(status) && lastError == null) {
+                    System.err.println(ERROR + "the window's process was ended by signal " + (status - SIGNALLED));
+                }
+                return status;
+            }
             state.ended = lastError != null ? lastError : "the effect ended its process with status " + status;
             lastError = null;
             state.write(folder);
