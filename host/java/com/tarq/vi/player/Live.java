@@ -140,6 +140,7 @@ public final class Live implements Session.Surface {
             watch = new PluginWatch(plugin, assets, folder, resumed ? state.build : null);
             if (resumed) {
                 lastReload = "ended " + wallClock() + ": " + state.ended + " | waiting for the next build";
+                state.ended = null;
                 redraw = true;
                 System.err.println("vi-live: the window waits for the next build of " + options.plugin);
             } else {

@@ -39,6 +39,8 @@ final class LiveState {
     long effectPid;
     /** Why the last window process ended, set by the supervising process; null when it did not end so. */
     String ended;
+    /** What was last written, so that a state written again unchanged is not. */
+    private Properties written;
 
     /** The state in folder, or null when no window process has written one. */
     static LiveState read(Path folder) throws IOException {
@@ -63,7 +65,10 @@ final class LiveState {
         return state;
     }
 
-    /** Replaces the state in folder as a whole: a process that ends while writing leaves the one before. */
+    /**
+     * Replaces the state in folder as a whole, when it has changed: a process
+     * that ends while writing leaves the one before.
+     */
     void write(Path folder) throws IOException {
         Properties values = new Properties();
         values.setProperty("x", "" + x);
@@ -80,10 +85,12 @@ final class LiveState {
         }
         i = 0;
         for (String name : warnedImages) values.setProperty("warned." + i++, name);
+        if (values.equals(written)) return;
         Path partial = folder.resolve(FILE + ".partial");
         try (Writer writer = Files.newBufferedWriter(partial)) {
             values.store(writer, null);
         }
         Files.move(partial, folder.resolve(FILE), StandardCopyOption.ATOMIC_MOVE, StandardCopyOption.REPLACE_EXISTING);
+        written = values;
     }
 }
