@@ -69,6 +69,9 @@ JNIEXPORT void JNICALL WINDOW_NATIVE(open)(JNIEnv* env, jclass, jstring title, j
     // and a script finds it by that whichever process opened it.
     SDL_SetHint(SDL_HINT_APP_NAME, "vi-live");
     setenv("SDL_VIDEO_X11_WMCLASS", "vi-live", 0);
+    // An X display and no Wayland one: X11 only, so that a display that refuses the window for a moment
+    // (a virtual one regenerating) does not send SDL to Wayland, whose library prints its own complaint.
+    if (std::getenv("DISPLAY") && !std::getenv("WAYLAND_DISPLAY")) SDL_SetHint(SDL_HINT_VIDEODRIVER, "x11");
     if (SDL_Init(SDL_INIT_VIDEO) != 0) {
         fail(env, "no display to open a window on");
         return;

@@ -44,7 +44,7 @@ class LiveWindowTest {
         String badOption = run(viLive, "--fps", "30", plugin.toString());
         assertTrue(badOption.contains("unknown option --fps") && badOption.endsWith("status 2"), badOption);
         // A crash in the effect, run from a copy that is gone: the signal's status and the effect's own line.
-        String crash = run(viLive, System.getProperty("vi.nullwrite"));
+        String crash = run(viLive, mistake("nullwrite").toString());
         assertTrue(crash.contains("vi-live: error: the effect crashed: SIGSEGV") && crash.contains("draw")
             && crash.contains("Mistake.cpp:") && crash.endsWith("status 139"), crash);
 
@@ -102,23 +102,28 @@ class LiveWindowTest {
         awaitText("key code 67 is refused");
         assertEquals(ORANGE, shot().getRGB(90, 160) & WHITE);
 
-        // Builds that end the process, by the runtime's exit and by a crash: the window is back where it was,
-        // turned as it was, says why in its title, and waits; the good build again brings the effect back,
-        // with the image typed in.
+        // Builds that end the process, by each of the runtime's exits and by crashes: the window is back where
+        // it was, turned as it was, says why in its title, and waits; the good build again brings the effect
+        // back, with the image typed in.
         live.outputWriter().append("image wallpaper " + System.getProperty("vi.picture") + "\n").flush();
         poll(() -> (shot().getRGB(4, 316) & WHITE) == GREEN ? "" : null);
         run("xdotool", "windowmove", window, "130", "70");
         run("xdotool", "key", "o");
         String placed = poll(() -> geometry().contains("Position: 130,70") ? geometry() : null);
         assertTrue(placed.contains("Geometry: 320x180"), placed);
-        rebuild(Path.of(System.getProperty("vi.shader")), "vi-live: error: the fragment shader does not compile");
-        poll(() -> run("xdotool", "getwindowname", findWindow()).contains("waiting") ? "" : null);
-        assertEquals(placed, geometry(), "the window back in its place");
-        assertTrue(run("xdotool", "getwindowname", findWindow()).contains("fragment shader does not compile"));
-        rebuild(Path.of(System.getProperty("vi.nullwrite")), "vi-live: error: the effect crashed: SIGSEGV");
-        poll(() -> run("xdotool", "getwindowname", findWindow()).contains("crashed: SIGSEGV") ? "" : null);
+        String[][] endings = {{"shader", "the fragment shader does not compile (the effect ended with status 88)"},
+            {"link", "the shader program does not link (the effect ended with status 67)"},
+            {"ghost", "it has no asset folder (the effect ended with status 71)"},
+            {"file", "could not open a file (the effect ended with status 45)"},
+            {"abort", "the effect crashed: SIGABRT"}, {"nullwrite", "the effect crashed: SIGSEGV"}};
+        for (String[] ending : endings) {
+            rebuild(mistake(ending[0]), ending[1]);
+            poll(() -> run("xdotool", "getwindowname", findWindow()).contains(ending[1]) ? "" : null);
+            assertEquals(placed, geometry(), "the window back in its place after " + ending[0]);
+        }
         Files.copy(Path.of(System.getProperty("vi.blue")), plugin, StandardCopyOption.REPLACE_EXISTING);
-        poll(() -> Files.readString(log).split("vi-live: reloaded", -1).length == 4 ? "" : null);  // orange, crash, blue
+        // Orange, the two that started and crashed at their first frame, then blue.
+        poll(() -> Files.readString(log).split("vi-live: reloaded", -1).length == 5 ? "" : null);
         BufferedImage back = shot();
         assertEquals(List.of(320, 180, BLUE, GREEN), List.of(back.getWidth(), back.getHeight(),
             back.getRGB(300, 170) & WHITE, back.getRGB(4, 176) & WHITE), "the effect back, turned, with its image");
@@ -131,26 +136,37 @@ class LiveWindowTest {
         assertEquals(List.of(), leftBehind(live));
     }
 
-    /** However the window is ended from outside, neither its process nor its files stay. */
+    /**
+     * However vi-live or its window process is ended from outside, neither
+     * process nor their files stay; only the unexpected end is reported.
+     */
     @Test
     void endedFromOutsideLeavesNothing() throws Exception {
         scratch = Files.createTempDirectory(Files.createDirectories(Path.of(System.getProperty("vi.scratch"))), "end-");
-        log = scratch.resolve("log.txt");
-        for (String signal : List.of("TERM", "KILL")) {
+        // Whom the signal is sent to, the signal, vi-live's status and the last it says.
+        String[][] rows = {{"vi-live", "TERM", "143", "playing"}, {"vi-live", "KILL", "137", "playing"},
+            {"window", "KILL", "137", "vi-live: error: the window's process was ended by signal 9"}};
+        for (String[] row : rows) {
+            log = scratch.resolve(row[0] + "-" + row[1] + ".txt");
             live = new ProcessBuilder(System.getProperty("vi.live"), System.getProperty("vi.blue"))
                 .redirectOutput(log.toFile()).redirectErrorStream(true).start();
             awaitText("vi-live: playing");
             List<ProcessHandle> window = live.descendants().toList();
-            assertFalse(window.isEmpty());
-            run("kill", "-" + signal, "" + live.pid());
-            live.waitFor();
-            for (long end = System.currentTimeMillis() + 20_000; window.stream().anyMatch(ProcessHandle::isAlive);
-                Thread.sleep(20)) {
-                assertTrue(System.currentTimeMillis() < end, "the window process outlives SIG" + signal);
+            assertEquals(1, window.size());
+            run("kill", "-" + row[1], "" + (row[0].equals("window") ? window.get(0).pid() : live.pid()));
+            assertEquals(Integer.parseInt(row[2]), live.waitFor(), String.join(" ", row));
+            for (long end = System.currentTimeMillis() + 20_000; window.get(0).isAlive(); Thread.sleep(20)) {
+                assertTrue(System.currentTimeMillis() < end, "the window process outlives " + String.join(" ", row));
             }
-            assertEquals(List.of(), leftBehind(live), "SIG" + signal);
-            assertTrue(run(FIND_WINDOW).endsWith("status 1"), "SIG" + signal);
+            List<String> said = Files.readAllLines(log);
+            assertTrue(said.get(said.size() - 1).contains(row[3]), said.toString());
+            assertEquals(List.of(), leftBehind(live), String.join(" ", row));
+            assertTrue(run(FIND_WINDOW).endsWith("status 1"), String.join(" ", row));
         }
+    }
+
+    private static Path mistake(String name) {
+        return Path.of(System.getProperty("vi.mistakes"), "libvi_mistake_" + name + ".so");
     }
 
     /** The window's folders in the temporary folder, and what they hold. */
