@@ -97,13 +97,15 @@ JNIEXPORT void JNICALL WINDOW_NATIVE(open)(JNIEnv* env, jclass, jstring title, j
     const char* chars = env->GetStringUTFChars(title, nullptr);
     const bool anywhere = x == kAnywhere;
     gWindow = SDL_CreateWindow(chars, anywhere ? SDL_WINDOWPOS_UNDEFINED : x, anywhere ? SDL_WINDOWPOS_UNDEFINED : y,
-                               width, height,
-                               SDL_WINDOW_OPENGL | SDL_WINDOW_SHOWN);
+                               width, height, SDL_WINDOW_OPENGL | SDL_WINDOW_SHOWN);
     env->ReleaseStringUTFChars(title, chars);
     if (!gWindow) {
         fail(env, "cannot open a GL ES 2 window");
         return;
     }
+    // A window manager may put its frame, not the window, at the place asked for at creation; moved once
+    // shown, with its borders known, the window itself is where position() read it, and stays put.
+    if (!anywhere) SDL_SetWindowPosition(gWindow, x, y);
     if (makeContext(env)) setViewport();
 }
 

@@ -61,12 +61,14 @@ public final class Live implements Session.Surface {
     private final int[] event = new int[3];
     private final String name;
     private PluginWatch watch;
+    private Console console;
     private AssetModels models;
     /** The copy of the plug-in the effect runs from; null while no effect runs. */
     private Path running;
     /** When the build last started was written, on the wall clock; 0 once its first frame is told. */
     private long reloadWrittenNanos;
     private final boolean benchReloads = System.getenv("VI_BENCH_RELOADS") != null;
+    private final boolean benching = System.getenv("VI_BENCH_FRAMES") != null;
     private String lastReload = "started";
     /** The effect's clock, from the start; stands still while paused. */
     private long effectNanos;
@@ -132,6 +134,9 @@ public final class Live implements Session.Surface {
             throw new Failure("the clock library is not preloaded; start it with vi-live");
         }
         session.turn(state.orientation);
+        // Reading standard input from now on: should the supervisor be lost while the window opens
+        // or the first build starts, this process still ends.
+        console = new Console(this::loseSupervisor);
         openWindow(resumed);
         try {
             if (assets != null) Desktop.setAssetDirectory(assets.toString());
@@ -250,7 +255,6 @@ public final class Live implements Session.Surface {
     private void loop() throws IOException {
         String benchFrames = System.getenv("VI_BENCH_FRAMES");
         int frames = benchFrames == null ? -1 : Integer.parseInt(benchFrames);
-        Console console = new Console(this::loseSupervisor);
         long last = System.nanoTime();
         long next = last;
         long titled = 0;
@@ -291,7 +295,8 @@ public final class Live implements Session.Surface {
         Window.swap();
         frameTimes.add(System.nanoTime() - started);
         step = redraw = screenshot = false;
-        if (!state.shown) {
+        // A bench run measures, and ends when its frames are done: it never waits for a build.
+        if (!state.shown && !benching) {
             state.shown = true;
             saveState();
         }
@@ -323,7 +328,12 @@ public final class Live implements Session.Surface {
                 state.images.remove(name);
                 state.images.put(name, file);
             }
-            if (running != null) session.apply(typed, this, Path.of(""));
+            if (running != null) {
+                session.apply(typed, this, Path.of(""));
+            } else if (!typed.kind().equals("image") && !typed.kind().equals("end")) {
+                System.err.println("vi-live: no effect runs; '" + typed.kind() + "' is dropped, and the window waits"
+                    + " for the next build");
+            }
         } catch (IOException e) {
             System.err.println("vi-live: stdin: " + e.getMessage());
         }

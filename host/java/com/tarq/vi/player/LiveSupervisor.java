@@ -53,13 +53,10 @@ final class LiveSupervisor {
 
     /** Runs window processes until one ends for good; its status. */
     static int run() throws IOException, Failure {
-        ProcessHandle.Info self = ProcessHandle.current().info();
-        if (self.command().isEmpty() || self.arguments().isEmpty()) {
-            throw new Failure("cannot read its own command line to start the window with");
-        }
-        List<String> command = new ArrayList<>();
-        command.add(self.command().get());
-        command.addAll(List.of(self.arguments().get()));
+        // The whole command line, however long (the JDK's view of it may be cut short).
+        String line = new String(Files.readAllBytes(Path.of("/proc/self/cmdline")), UTF_8);
+        List<String> command = new ArrayList<>(List.of(line.split("\0")));
+        if (command.size() < 2) throw new Failure("cannot read its own command line to start the window with");
         Path folder = Files.createTempDirectory("vi-live-" + ProcessHandle.current().pid() + "-");
         LiveSupervisor supervisor = new LiveSupervisor(folder, command);
         Runtime.getRuntime().addShutdownHook(new Thread(supervisor::stop, "vi-live stop"));
@@ -82,22 +79,25 @@ final class LiveSupervisor {
             errors.start();
             int status = process.waitFor();
             errors.join();
-            LiveState state = LiveState.read(folder);
+            // Under the lock: once stopping, the folder is the shutdown hook's to remove.
             synchronized (this) {
                 if (stopping) return status;
-            }
-            boolean effectEnded = EFFECT_ENDINGS.contains(status) && state != null && state.effectPid == process.pid();
-            // A build that ends the process before the window has shown anything is not
-            // waited out: the author sees the message and the status, as without a window.
-            if (!effectEnded || !state.shown) {
-                if (status > SIGNALLED && !ASKED_TO_END.contains(status) && lastError == null) {
-                    System.err.println(ERROR + "the window's process was ended by signal " + (status - SIGNALLED));
+                LiveState state = LiveState.read(folder);
+                boolean effectEnded = EFFECT_ENDINGS.contains(status) && state != null
+                    && state.effectPid == process.pid();
+                // A build that ends the process before the window has shown anything is not
+                // waited out: the author sees the message and the status, as without a window.
+                if (!effectEnded || !state.shown) {
+                    if (status > SIGNALLED && !ASKED_TO_END.contains(status) && lastError == null) {
+                        System.err.println(ERROR + "the window's process was ended by signal " + (status - SIGNALLED));
+                    }
+                    return status;
                 }
-                return status;
+                state.ended = lastError != null ? lastError : "the effect ended its process with status " + status;
+                state.effectPid = 0;
+                lastError = null;
+                state.write(folder);
             }
-            state.ended = lastError != null ? lastError : "the effect ended its process with status " + status;
-            lastError = null;
-            state.write(folder);
         }
     }
 
