@@ -5,6 +5,7 @@ import static java.nio.charset.StandardCharsets.UTF_8;
 import java.io.BufferedReader;
 import java.io.IOException;
 import java.io.OutputStream;
+import java.io.PrintStream;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.util.ArrayList;
@@ -23,8 +24,8 @@ import java.util.stream.Stream;
  * the next window process opens at the same place, turned the same way with
  * the same images, says why in its title, and waits for the next build;
  * otherwise the child's status is the status. Standard input is relayed to the
- * child as typed; the child takes the end of its standard input for a lost
- * supervisor and ends too. On SIGINT, SIGTERM or SIGHUP the child is ended and
+ * child as typed, and its output and errors back line by line; the child takes
+ * the end of its standard input for a lost supervisor and ends too. On SIGINT, SIGTERM or SIGHUP the child is ended and
  * the folder removed.
  */
 final class LiveSupervisor {
@@ -39,6 +40,8 @@ final class LiveSupervisor {
     private static final Set<Integer> ASKED_TO_END = Set.of(129, 130, 143);
     /** How long a child has to end on SIGTERM before it is killed. */
     private static final long STOP_SECONDS = 3;
+
+    private static final Object RELAY_LOCK = new Object();
 
     private final Path folder;
     private final List<String> command;
@@ -75,9 +78,12 @@ final class LiveSupervisor {
             Process process = start();
             if (process == null) return 1;
             if (input.getState() == Thread.State.NEW) input.start();
-            Thread errors = new Thread(() -> relayErrors(process), "vi-live errors");
+            Thread output = new Thread(() -> relay(process.inputReader(UTF_8), System.out), "vi-live output");
+            Thread errors = new Thread(() -> relay(process.errorReader(UTF_8), System.err), "vi-live errors");
+            output.start();
             errors.start();
             int status = process.waitFor();
+            output.join();
             errors.join();
             // Under the lock: once stopping, the folder is the shutdown hook's to remove.
             synchronized (this) {
@@ -104,7 +110,7 @@ final class LiveSupervisor {
     /** The next window process, or null once stopping. */
     private synchronized Process start() throws IOException {
         if (stopping) return null;
-        ProcessBuilder builder = new ProcessBuilder(command).redirectOutput(ProcessBuilder.Redirect.INHERIT);
+        ProcessBuilder builder = new ProcessBuilder(command);
         builder.environment().put(FOLDER_VARIABLE, folder.toString());
         child = builder.start();
         return child;
@@ -132,12 +138,19 @@ final class LiveSupervisor {
         // The child's standard input stays open: its end would tell the child this process is gone.
     }
 
-    /** The child's standard error, line by line, keeping the last error's words for the next window's title. */
-    private void relayErrors(Process process) {
-        try (BufferedReader reader = process.errorReader(UTF_8)) {
-            for (String line = reader.readLine(); line != null; line = reader.readLine()) {
-                if (line.startsWith(ERROR)) lastError = line.substring(ERROR.length());
-                System.err.println(line);
+    /**
+     * The child's standard output or error, a whole line at a time, so that
+     * the two never cut into each other's lines; the last error's words are
+     * kept for the next window's title.
+     */
+    private void relay(BufferedReader from, PrintStream to) {
+        try (from) {
+            for (String line = from.readLine(); line != null; line = from.readLine()) {
+                if (to == System.err && line.startsWith(ERROR)) lastError = line.substring(ERROR.length());
+                synchronized (RELAY_LOCK) {
+                    to.println(line);
+                    to.flush();
+                }
             }
         } catch (IOException e) {
             // The child has gone; what it said is said.
