@@ -12,6 +12,7 @@ import java.time.format.DateTimeFormatter;
 import java.time.temporal.ChronoUnit;
 import java.util.Locale;
 import java.util.Map;
+import java.util.Optional;
 import java.util.Set;
 import javax.imageio.ImageIO;
 
@@ -69,7 +70,9 @@ public final class Live implements Session.Surface {
     /** When the build last started was written, on the wall clock; 0 once its first frame is told. */
     private long reloadWrittenNanos;
     private final boolean benchReloads = System.getenv("VI_BENCH_RELOADS") != null;
-    private final boolean benching = System.getenv("VI_BENCH_FRAMES") != null;
+    /** The frames a bench run draws before it ends; -1 outside a bench run. */
+    private final int benchFrames = Optional.ofNullable(System.getenv("VI_BENCH_FRAMES")).map(Integer::parseInt)
+        .orElse(-1);
     private String lastReload = "started";
     /** The effect's clock, from the start; stands still while paused. */
     private long effectNanos;
@@ -254,8 +257,6 @@ public final class Live implements Session.Surface {
 
     /** One frame a sixtieth of a second: events, a settled build, the frame, the title. */
     private void loop() throws IOException {
-        String benchFrames = System.getenv("VI_BENCH_FRAMES");
-        int frames = benchFrames == null ? -1 : Integer.parseInt(benchFrames);
         long last = System.nanoTime();
         long next = last;
         long titled = 0;
@@ -281,8 +282,8 @@ public final class Live implements Session.Surface {
                 Window.setTitle(title());
                 saveState();
             }
-            if (frames >= 0) {
-                quit |= frameTimes.count() >= frames;
+            if (benchFrames >= 0) {
+                quit |= frameTimes.count() >= benchFrames;
             } else {
                 next = pace(next);
             }
@@ -297,7 +298,7 @@ public final class Live implements Session.Surface {
         frameTimes.add(System.nanoTime() - started);
         step = redraw = screenshot = false;
         // A bench run measures, and ends when its frames are done: it never waits for a build.
-        if (!state.shown && !benching) {
+        if (!state.shown && benchFrames < 0) {
             state.shown = true;
             saveState();
         }
@@ -397,10 +398,10 @@ public final class Live implements Session.Surface {
             reason = "cannot copy it: " + e.getMessage();
         }
         Path before = running;
-        reloadWrittenNanos = watch.written();
         boolean started = copy != null && reason == null && start(copy);
         if (copy != null) PluginWatch.discard(copy);
         if (started) {
+            reloadWrittenNanos = watch.written();
             lastReload = "reloaded " + wallClock();
             System.out.println("vi-live: reloaded " + options.plugin);
             System.out.flush();
